@@ -1,0 +1,28 @@
+// SPDX-License-Identifier: BSD-2-Clause
+#pragma once
+
+#include <utility>
+
+#include <unistd.h>
+
+namespace tz::fs {
+
+/// Owner of what open(2) returned: a file descriptor, or -1 after a failure.
+class descriptor {
+  public:
+    explicit descriptor(int number) : number_(number) {}
+    descriptor(const descriptor&) = delete;
+    descriptor& operator=(const descriptor&) = delete;
+    ~descriptor() { close(); }
+
+    [[nodiscard]] int number() const { return number_; }
+    [[nodiscard]] bool is_open() const { return number_ != -1; }
+
+    /// Closes early, for those who want to know how it went: close(2)'s result; 0 if not open.
+    int close() { return is_open() ? ::close(std::exchange(number_, -1)) : 0; }
+
+  private:
+    int number_;
+};
+
+} // namespace tz::fs
