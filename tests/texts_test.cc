@@ -1,14 +1,90 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #include <cerrno>
+#include <regex>
+#include <stdexcept>
 
 #include "fs/operations.h"
 #include "platform/warn.h"
 #include "private_root.h"
+#include "version/data_version.h"
 
 namespace tz::test {
 namespace {
 
 using std::string_literals::operator""s;
+using groups = std::vector<std::string>; // of a text that matches; none if it does not
+
+void for_each_text(const std::string& alphabet, std::size_t longest,
+                   const std::function<void(const std::string&)>& check, std::string text = "") {
+    check(text);
+    for (std::size_t i = 0; text.size() < longest && i < alphabet.size(); ++i) {
+        for_each_text(alphabet, longest, check, text + alphabet[i]);
+    }
+}
+
+groups matched(const std::string& text, const std::regex& pattern) {
+    std::smatch match;
+    return std::regex_match(text, match, pattern) ? groups(++match.begin(), match.end()) : groups();
+}
+
+TEST(version_text, splits_as_its_pattern_says) {
+    const std::regex pattern(R"(([0-9]+)([a-z]+)(?:\.([0-9]+))?(?:\.([0-9]+))?)");
+    const auto check = [&](const std::string& text) {
+        groups found;
+        if (const auto pieces = split_version(text)) {
+            for (auto piece : {pieces->year, pieces->letters, pieces->minor, pieces->patch}) {
+                found.emplace_back(piece);
+            }
+        }
+        ASSERT_EQ(found, matched(text, pattern)) << testing::PrintToString(text);
+    };
+    for_each_text("09az./:`{A -\n\0\xe9"s, 4, check); // with the neighbours of 0, 9, a and z
+    for_each_text("0a.-", 8, check);
+}
+
+std::string shown(const data_version& version) {
+    return std::to_string(version.year) + " " + version.letters + " " +
+           std::to_string(version.minor) + " " + std::to_string(version.patch);
+}
+
+TEST(version_text, becomes_numbers_and_letters) {
+    const std::string letters(1 << 20, 'z');
+    const std::string digits(1 << 20, '9');
+    const tree versions = {
+        {"2016f", "2016 f -1 -1"},
+        {"02016aa.010.00", "2016 aa 10 0"},
+        {"2147483647a.2147483646.2147483647", "2147483647 a 2147483646 2147483647"},
+        {"1" + letters + ".2", "1 " + letters + " 2 -1"},
+        {digits, "-1  -1 -1"},
+        {"2016F.1.0", "-1  -1 -1"},
+        {digits + "a", "too large"},
+        {"2147483648a", "too large"},
+        {"1a.2147483648", "too large"},
+        {"1a.1.99999999999999999999", "too large"},
+    };
+    for (const auto& [text, version] : versions) {
+        try {
+            EXPECT_EQ(shown(data_version(text)), version);
+        } catch (const std::out_of_range&) {
+            EXPECT_EQ("too large", version);
+        }
+    }
+}
+
+TEST(version, is_ordered_field_by_field) {
+    std::vector<data_version> ascending(1); // the unknown version is the oldest
+    for (const auto* text :
+         {"0a", "999z", "1000a", "2016a", "2016a.0", "2016a.0.0", "2016a.1.9", "2016a.2",
+          "2016a.10", "2016aa", "2016b", "2016z", "2016za", "2017a"}) {
+        ascending.emplace_back(text);
+    }
+    for (const auto& left : ascending) {
+        for (const auto& right : ascending) {
+            EXPECT_EQ(left > right, &left > &right) << shown(left) << " > " << shown(right);
+            EXPECT_EQ(left == right, &left == &right) << shown(left) << " == " << shown(right);
+        }
+    }
+}
 
 TEST(word, is_the_first_in_a_regular_file) {
     const std::string page(4096, 'x'); // of which several are read in turn
