@@ -3,6 +3,7 @@
 #include <regex>
 #include <stdexcept>
 
+#include "dataset/kiv_icu.h"
 #include "fs/operations.h"
 #include "platform/warn.h"
 #include "private_root.h"
@@ -40,6 +41,19 @@ TEST(version_text, splits_as_its_pattern_says) {
     };
     for_each_text("09az./:`{A -\n\0\xe9"s, 4, check); // with the neighbours of 0, 9, a and z
     for_each_text("0a.-", 8, check);
+}
+
+TEST(icu_file_name, holds_the_schema_as_its_pattern_says) {
+    const std::regex pattern(R"(icutz([0-9]+[lbe])\.dat)");
+    for (const auto* prefix : {"icutz", "icut", "xicutz", "ICUTZ", ""}) {
+        for (const auto& suffix : {".dat"s, "xdat"s, ".dat.bak"s, ".DAT"s, ".dat\n"s, "\0.dat"s}) {
+            for_each_text("09/:lbemLa.", 4, [&](const std::string& middle) {
+                const auto name = prefix + middle + suffix;
+                const groups found{std::string(icu_schema_in_name(name))};
+                ASSERT_EQ(found.front().empty() ? groups() : found, matched(name, pattern)) << name;
+            });
+        }
+    }
 }
 
 std::string shown(const data_version& version) {
