@@ -17,7 +17,7 @@ extern "C" char* __progname; // NOLINT(bugprone-reserved-identifier,cert-dcl*)
 namespace tz {
 namespace {
 
-std::string formatted(const char* format, std::va_list values) {
+[[gnu::format(printf, 1, 0)]] std::string formatted(const char* format, std::va_list values) {
     std::va_list measured;
     va_copy(measured, values);
     const int length = std::vsnprintf(nullptr, 0, format, measured);
@@ -29,7 +29,7 @@ std::string formatted(const char* format, std::va_list values) {
     std::va_list printed;
     va_copy(printed, values);
     std::string text(static_cast<std::size_t>(length), '\0');
-    std::vsnprintf(text.data(), text.size() + 1, format, printed);
+    (void)std::vsnprintf(text.data(), text.size() + 1, format, printed);
     va_end(printed);
     return text;
 }
@@ -43,7 +43,7 @@ void warn(const char* format, ...) {
     try {
         const std::string line = std::string(__progname) + ": " + formatted(format, values) + ": " +
                                  std::strerror(reason) + "\n";
-        (void)!::write(STDERR_FILENO, line.data(), line.size());
+        [[maybe_unused]] const auto written = ::write(STDERR_FILENO, line.data(), line.size());
     } catch (const std::bad_alloc&) {
         errno = reason;
         ::vwarn(format, values); // needs no memory, at the price of several writes

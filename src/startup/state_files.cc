@@ -29,7 +29,7 @@ void write_version_diff_record(const kiv_dataset& effective, const kiv_dataset& 
         ::open(layout::version_diff_record,
                O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NONBLOCK | O_NOCTTY, 0666));
     if (record.is_open()) {
-        (void)!::write(record.number(), text.data(), text.size());
+        [[maybe_unused]] const auto written = ::write(record.number(), text.data(), text.size());
     }
 }
 

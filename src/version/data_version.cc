@@ -19,8 +19,8 @@ bool is_letter(char c) {
 
 // Cuts the run of bytes that are of one kind off the front of `text`, and returns it.
 std::string_view take(std::string_view& text, bool (*is_of_kind)(char)) {
-    const auto end = std::find_if_not(text.begin(), text.end(), is_of_kind);
-    const std::string_view run(text.begin(), end);
+    const std::string_view run(text.begin(),
+                               std::find_if_not(text.begin(), text.end(), is_of_kind));
     text.remove_prefix(run.size());
     return run;
 }
