@@ -15,6 +15,13 @@
 #include "platform/warn.h"
 
 namespace tz::fs {
+namespace {
+
+bool is_white_space(char c) {
+    return c == ' ' || ('\t' <= c && c <= '\r');
+}
+
+} // namespace
 
 void remove(const std::string& path) {
     if (::unlink(path.c_str()) == 0 || errno == ENOENT) {
@@ -57,8 +64,6 @@ void set_protection_class(const std::string& path) {
 }
 
 std::string read_word(const std::string& path) {
-    constexpr std::string_view white_space = " \t\n\v\f\r";
-
     // Non-blocking, for a FIFO without a writer would hold up the start for ever.
     const descriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY));
     struct stat status {};
@@ -73,13 +78,13 @@ std::string read_word(const std::string& path) {
         if (length == -1) {
             return {};
         }
-        std::string_view text(buffer.data(), static_cast<std::size_t>(length));
-        if (word.empty()) {
-            text.remove_prefix(std::min(text.find_first_not_of(white_space), text.size()));
-        }
-        const std::size_t end = text.find_first_of(white_space);
-        word += text.substr(0, end);
-        if (length == 0 || end != std::string_view::npos) {
+        const std::string_view text(buffer.data(), static_cast<std::size_t>(length));
+        const auto* const begin = word.empty()
+                                      ? std::find_if_not(text.begin(), text.end(), is_white_space)
+                                      : text.begin();
+        const auto* const end = std::find_if(begin, text.end(), is_white_space);
+        word.append(begin, end);
+        if (text.empty() || end != text.end()) {
             return word;
         }
     }
