@@ -1,10 +1,8 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #include <algorithm>
 #include <cerrno>
-#include <regex>
 #include <stdexcept>
 
-#include "dataset/kiv_icu.h"
 #include "fs/operations.h"
 #include "platform/warn.h"
 #include "private_root.h"
@@ -14,50 +12,6 @@ namespace tz::test {
 namespace {
 
 using namespace std::string_literals;
-using groups = std::vector<std::string>; // of a text that matches; none if it does not
-
-void for_each_text(const std::string& alphabet, std::size_t longest,
-                   const std::function<void(const std::string&)>& check,
-                   const std::string& text = "") {
-    check(text);
-    for (std::size_t i = 0; text.size() < longest && i < alphabet.size(); ++i) {
-        for_each_text(alphabet, longest, check, text + alphabet[i]);
-    }
-}
-
-groups matched(const std::string& text, const std::regex& pattern) {
-    std::smatch match;
-    return std::regex_match(text, match, pattern) ? groups(++match.begin(), match.end()) : groups();
-}
-
-TEST(version_text, splits_as_its_pattern_says) {
-    const std::regex pattern(R"(([0-9]+)([a-z]+)(?:\.([0-9]+))?(?:\.([0-9]+))?)");
-    const auto check = [&](const std::string& text) {
-        groups found;
-        if (const auto pieces = split_version(text)) {
-            for (auto piece : {pieces->year, pieces->letters, pieces->minor, pieces->patch}) {
-                found.emplace_back(piece);
-            }
-        }
-        ASSERT_EQ(found, matched(text, pattern)) << testing::PrintToString(text);
-    };
-    for_each_text("09az./:`{A -\n\0\xe9"s, 4, check); // with the neighbours of 0, 9, a and z
-    for_each_text("0a.-", 8, check);
-}
-
-TEST(icu_file_name, holds_the_schema_as_its_pattern_says) {
-    const std::regex pattern(R"(icutz([0-9]+[lbe])\.dat)");
-    for (const auto* prefix : {"icutz", "icut", "xicutz", "ICUTZ", ""}) {
-        for (const auto& suffix : {".dat"s, "xdat"s, ".dat.bak"s, ".DAT"s, ".dat\n"s, "\0.dat"s}) {
-            for_each_text("09/:lbemLa.", 4, [&](const std::string& middle) {
-                const auto name = (prefix + middle).append(suffix);
-                const groups found{std::string(icu_schema_in_name(name))};
-                ASSERT_EQ(found.front().empty() ? groups() : found, matched(name, pattern)) << name;
-            });
-        }
-    }
-}
-
 std::string shown(const data_version& version) {
     return std::to_string(version.year) + " " + version.letters + " " +
            std::to_string(version.minor) + " " + std::to_string(version.patch);
