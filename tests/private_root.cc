@@ -10,6 +10,7 @@
 #include <fcntl.h>
 #include <sched.h>
 #include <sys/mman.h>
+#include <sys/mount.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -23,6 +24,7 @@ const std::string updates = "/var/db/timezone/tz/";
 int program = -1; // opened while its path can still be reached
 
 void empty_root() {
+    ::umount2("/var/db", MNT_DETACH); // where a test may have mounted
     for (const auto& inhabitant : fs::directory_iterator("/")) {
         fs::remove_all(inhabitant.path());
     }
@@ -52,10 +54,7 @@ tree parsed(const std::string& text) {
     return entries;
 }
 
-void lay_out(const tree& entries) {
-    empty_root();
-    fs::create_directories("/var/db/timezone");
-    fs::current_path("/var/db/timezone");
+void add(const tree& entries) {
     for (const auto& [path, what] : entries) {
         fs::create_directories(fs::absolute(path).parent_path());
         if (what.starts_with("->")) {
@@ -68,6 +67,13 @@ void lay_out(const tree& entries) {
             fs::create_directory(path);
         }
     }
+}
+
+void lay_out(const tree& entries) {
+    empty_root();
+    fs::create_directories("/var/db/timezone");
+    fs::current_path("/var/db/timezone");
+    add(entries);
 }
 
 tree state() {
@@ -105,15 +111,23 @@ std::string warnings_of(const std::function<void()>& action, bool with_reasons) 
     return warnings;
 }
 
-int run_program() {
-    int status = ::fork();
-    if (status == 0) {
+pid_t start_program(const std::function<void()>& beforehand) {
+    const pid_t child = ::fork();
+    if (child == 0) {
+        ::alarm(20); // outlives the exec: a start that hangs dies of it
+        ::close_range(3, ~0U, CLOSE_RANGE_CLOEXEC);
+        beforehand();
         std::string name = "tzreconcile";
         char* const arguments[] = {name.data(), nullptr};
-        ::fexecve(program, arguments, arguments + 1);
+        ::fexecve(program, arguments, environ == nullptr ? arguments + 1 : environ);
         ::_exit(127);
     }
-    ::wait(&status);
+    return child;
+}
+
+int run_program(const std::function<void()>& beforehand) {
+    int status = 0;
+    ::waitpid(start_program(beforehand), &status, 0);
     return status;
 }
 
@@ -129,10 +143,13 @@ int main(int count, char** arguments) {
     const auto beside = fs::read_symlink("/proc/self/exe").parent_path();
     tz::test::program = ::open((beside / "tzreconcile").c_str(), O_RDONLY | O_CLOEXEC);
 
+    tz::test::dev_full = ::open("/dev/full", O_WRONLY | O_CLOEXEC);
+
     std::string root = fs::temp_directory_path() / "tzreconcile-XXXXXX";
     const int outside = ::open("/", O_DIRECTORY | O_CLOEXEC);
     const auto user = ::geteuid();
-    if (user != 0 && ::unshare(CLONE_NEWUSER) == 0) { // where anybody may enter another root
+    // In a user namespace of their own anybody may enter another root, and mount there.
+    if (::unshare(user == 0 ? CLONE_NEWNS : CLONE_NEWUSER | CLONE_NEWNS) == 0 && user != 0) {
         std::ofstream("/proc/self/uid_map") << "0 " << user << " 1";
     }
     if (::mkdtemp(root.data()) == nullptr || ::chroot(root.c_str()) != 0 || ::chdir("/") != 0) {

@@ -6,6 +6,7 @@
 #include <string>
 
 #include <gtest/gtest.h>
+#include <sys/types.h>
 
 /// The program's paths are absolute and fixed, so the tests run in a root directory of their own,
 /// which main enters before the first test. It holds nothing but what a test lays out there.
@@ -19,8 +20,10 @@ using tree = std::map<std::string, std::string>;
 /// A tree from a text such as "zoneinfo->@2016a/zoneinfo, needs_cleanup=, tz_latest!".
 tree parsed(const std::string& text);
 
-/// Makes the root hold just what `entries` say and the directories above, /var/db/timezone at the
-/// least, which is then the working directory.
+/// Adds `entries`, and the directories above, to what the root holds.
+void add(const tree& entries);
+
+/// Makes the root hold just `entries`, and /var/db/timezone, which is then the working directory.
 void lay_out(const tree& entries);
 
 /// What is in /var/db, except for the updates.
@@ -29,7 +32,13 @@ tree state();
 /// The warning lines that `action` writes, without the program's name and (unless wanted) reason.
 std::string warnings_of(const std::function<void()>& action, bool with_reasons = false);
 
-/// Runs the built program in a process of its own; returns its wait(2) status.
-int run_program();
+/// /dev/full, which the root does not have.
+inline int dev_full = -1;
+
+/// Starts the built program in a process of its own, which does something `beforehand`.
+pid_t start_program(const std::function<void()>& beforehand);
+
+/// The wait(2) status with which the built program ends.
+int run_program(const std::function<void()>& beforehand = [] {});
 
 } // namespace tz::test
