@@ -81,7 +81,7 @@ TEST(word, is_the_first_in_a_regular_file) {
         EXPECT_EQ(fs::read_word("file"), word);
     }
     const int writer = ::open("fifo", O_RDWR); // so that there is something to read
-    EXPECT_EQ(::write(writer, "word", 4), 4);
+    EXPECT_EQ(::write(writer, "word ", 5), 5);
     for (const auto* unreadable : {"fifo", "/", "missing"}) {
         EXPECT_EQ(fs::read_word(unreadable), "");
     }
