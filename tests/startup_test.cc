@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #include <fcntl.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include "dataset/kiv_icu.h"
 #include "dataset/kiv_zoneinfo.h"
@@ -195,6 +196,13 @@ TEST(start, gives_later_lines_the_reason_of_the_first) {
                              "time-zone links: File exists\n"}) {
         EXPECT_NE(warnings.find(line), std::string::npos) << warnings;
     }
+}
+
+TEST(start, makes_the_standard_descriptors_valid) {
+    prepare("");
+    ::close(STDIN_FILENO);
+    EXPECT_EQ(program_main(), 0);
+    EXPECT_NE(::fcntl(STDIN_FILENO, F_GETFD), -1);
 }
 
 TEST(start, takes_data_protection_off) {
