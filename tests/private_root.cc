@@ -143,9 +143,12 @@ int main(int count, char** arguments) {
     std::string root = fs::temp_directory_path() / "tzreconcile-XXXXXX";
     const int outside = ::open("/", O_DIRECTORY | O_CLOEXEC);
     const auto user = ::geteuid();
+    const auto group = ::getegid();
     // In a user namespace of their own anybody may enter another root, and mount there.
     if (::unshare(user == 0 ? CLONE_NEWNS : CLONE_NEWUSER | CLONE_NEWNS) == 0 && user != 0) {
         std::ofstream("/proc/self/uid_map") << "0 " << user << " 1";
+        std::ofstream("/proc/self/setgroups") << "deny";
+        std::ofstream("/proc/self/gid_map") << "0 " << group << " 1";
     }
     if (::mkdtemp(root.data()) == nullptr || ::chroot(root.c_str()) != 0 || ::chdir("/") != 0) {
         std::perror("cannot enter a private root");
