@@ -33,7 +33,6 @@ extern "C" {
 void* __libc_malloc(std::size_t size);
 void* __libc_calloc(std::size_t count, std::size_t size);
 void* __libc_realloc(void* memory, std::size_t size);
-void __libc_free(void* memory);
 
 void* malloc(std::size_t size) {
     return runs_out() ? nullptr : __libc_malloc(size);
@@ -45,10 +44,6 @@ void* calloc(std::size_t count, std::size_t size) {
 
 void* realloc(void* memory, std::size_t size) {
     return runs_out() ? nullptr : __libc_realloc(memory, size);
-}
-
-void free(void* memory) {
-    __libc_free(memory);
 }
 
 FTS* fts_open(char* const* paths, int options, int (*order)(const FTSENT**, const FTSENT**)) {
