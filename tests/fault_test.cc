@@ -2,14 +2,11 @@
 #include <array>
 #include <cerrno>
 #include <csignal>
-#include <cstdlib>
 #include <cstring>
 #include <filesystem>
 
 #include <fcntl.h>
-#include <sys/mount.h>
 #include <sys/ptrace.h>
-#include <sys/resource.h>
 #include <sys/syscall.h>
 #include <sys/uio.h>
 #include <sys/user.h>
@@ -74,11 +71,6 @@ bool go_on(pid_t child, int& status) {
     ::ptrace(PTRACE_SYSCALL, child, 0, is_ours ? 0 : stopped_by);
     ::waitpid(child, &status, 0);
     return WIFSTOPPED(status);
-}
-
-void limit(decltype(RLIMIT_FSIZE) resource, rlim_t value) {
-    const rlimit both{value, value};
-    ::setrlimit(resource, &both);
 }
 
 // Runs the program and makes its system call number `nth` since main began fail with `error`, or
@@ -169,86 +161,6 @@ TEST(fault, at_any_call_is_survived) {
 TEST(fault, DISABLED_at_any_call_of_any_start_is_survived) {
     disturb_every_call(starts, {killed, EIO, ENOENT, EACCES, EEXIST, ENOMEM, ENOSPC, EINTR, EMFILE,
                                 EROFS, EINVAL});
-}
-
-TEST(process, with_an_odd_environment_starts_all_the_same) {
-    std::vector<std::pair<std::string, std::function<void()>>> oddities = {
-        {"no environment", [] { ::clearenv(); }},
-        {"a hostile environment",
-         [] {
-             for (const auto* name : {"LD_PRELOAD", "LC_ALL", "LANGUAGE", "NLSPATH", "TZ", "TMPDIR",
-                                      "GLIBC_TUNABLES", "MALLOC_PERTURB_", "LD_LIBRARY_PATH"}) {
-                 ::setenv(name, "../%s%n/\xff=:", 1);
-             }
-         }},
-        {"stderr that nobody reads",
-         [] {
-             std::array<int, 2> ends{};
-             [[maybe_unused]] const int made = ::pipe(ends.data());
-             ::dup2(ends[1], STDERR_FILENO);
-             ::close(ends[0]);
-         }},
-        {"stderr that is full", [] { ::dup2(dev_full, STDERR_FILENO); }},
-        {"no file may grow", [] { limit(RLIMIT_FSIZE, 0); }},
-        {"five descriptors", [] { limit(RLIMIT_NOFILE, 5); }},
-        {"a working directory that is gone",
-         [] {
-             std::filesystem::create_directory("gone");
-             std::filesystem::current_path("gone");
-             std::filesystem::remove("/var/db/timezone/gone");
-         }},
-    };
-    for (unsigned closed = 1; closed < 8; ++closed) {
-        oddities.emplace_back("closed descriptors " + std::to_string(closed), [closed] {
-            for (int descriptor = 0; descriptor < 3; ++descriptor) {
-                (closed >> descriptor & 1U) != 0 ? ::close(descriptor) : 0;
-            }
-        });
-    }
-    for (const auto& [name, beforehand] : oddities) {
-        lay_out(parsed(data + starts.at("drop and adopt")));
-        int status = -1;
-        warnings_of([&status, act = beforehand] { status = run_program(act); });
-        EXPECT_EQ(status, 0) << name;
-        const auto after = state();
-        EXPECT_EQ(after.at("zoneinfo"), "->@2016d/zoneinfo") << name;
-        EXPECT_EQ(after.at("icutz"), "->@2016d/icutz") << name;
-        EXPECT_EQ(after.at("needs_cleanup"), "=") << name;
-        const bool no_room = name == "no file may grow";
-        EXPECT_EQ(after.at("TZVersionDiffRecord"), no_room ? "=" : "=2016c.1.0_2016d") << name;
-    }
-}
-
-TEST(file_system, that_is_full_or_read_only_keeps_usable_links) {
-    const struct {
-        const char* options;
-        unsigned long flags;
-        int status;
-        std::string zoneinfo;
-        std::string record;
-        std::string last_words;
-    } table[] = {
-        {"nr_inodes=40", 0, 0, "->@2016e/zoneinfo", "",
-         "Cannot touch file /var/db/timezone/needs_cleanup\n"},
-        {"size=64k", 0, 0, "->@2016e/zoneinfo", "=", ""},
-        {"", MS_RDONLY, 1, "->@2016d/zoneinfo", "", "Could not set all time-zone links\n"},
-    };
-    for (const auto& row : table) {
-        lay_out({});
-        ASSERT_EQ(::mount("none", "/var/db", "tmpfs", 0, row.options), 0) << std::strerror(errno);
-        std::filesystem::create_directory("/var/db/timezone");
-        std::filesystem::current_path("/var/db/timezone");
-        add(parsed(data + starts.at("replace")));
-        for (int i = 0; row.flags == 0 && i < 40; ++i) { // more than there is room for
-            add({{"/var/db/ballast" + std::to_string(i), "=" + std::string(4096, 'x')}});
-        }
-        ASSERT_EQ(::mount("none", "/var/db", "tmpfs", MS_REMOUNT | row.flags, row.options), 0);
-        const auto said =
-            warnings_of([&] { EXPECT_EQ(WEXITSTATUS(run_program()), row.status) << row.options; });
-        EXPECT_TRUE(said.ends_with(row.last_words)) << said;
-        EXPECT_EQ(state()["zoneinfo"], row.zoneinfo);
-        EXPECT_EQ(state()["TZVersionDiffRecord"], row.record);
-    }
 }
 
 } // namespace

@@ -37,7 +37,8 @@ std::string described(const fs::path& path) {
     }
     if (fs::is_regular_file(path)) {
         std::ifstream file(path);
-        return "=" + std::string(std::istreambuf_iterator(file), {});
+        const bool usual = fs::status(path).permissions() == fs::perms(0644);
+        return (usual ? "=" : "odd mode=") + std::string(std::istreambuf_iterator(file), {});
     }
     return fs::is_directory(path) ? "/" : "|";
 }
@@ -150,6 +151,8 @@ int main(int count, char** arguments) {
         std::ofstream("/proc/self/setgroups") << "deny";
         std::ofstream("/proc/self/gid_map") << "0 " << group << " 1";
     }
+    ::mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr); // and no one else sees it
+    ::umask(022);
     if (::mkdtemp(root.data()) == nullptr || ::chroot(root.c_str()) != 0 || ::chdir("/") != 0) {
         std::perror("cannot enter a private root");
         return 1;

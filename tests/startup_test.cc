@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #include <fcntl.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 #include "dataset/kiv_icu.h"
@@ -41,7 +42,7 @@ const std::string before =
     "tz/2016c.1.0/icutz->../2016a/icutz, "
     "tz/2016d/icutz/icutz44l.dat=, tz/2016e/icutz/icutz44b.dat=, tz/2016f/icutz/icutz44l.dat/, "
     "tz/2016f/icutz/a/icutz44l.dat=, tz/2016g/icutz/icutz44l.dat->/usr/share/icu/icutz46l.dat, "
-    "tz/2016h/icutz|, tz/9999999999a/, ";
+    "tz/2016h/icutz|, tz/2016i/icutz/icutz44l.dat=, tz/9999999999a/, ";
 
 const std::string bad = "Bad zoneinfo link ";
 const std::string invalid = "Invalid current symlinks; resetting to system partition\n";
@@ -91,6 +92,9 @@ const struct {
     {"zoneinfo->@2016c.1.0/x, tz_latest->@2016d, needs_cleanup/x=",
      "Cannot touch file /var/db/timezone/needs_cleanup\n",
      d + "TZVersionDiffRecord=2016c.1.0_2016d"},
+    {"zoneinfo->@2016d/x, tz_latest->@2016i", "",
+     "zoneinfo->@2016i/zoneinfo, icutz->@2016i/icutz, needs_cleanup=, "
+     "TZVersionDiffRecord=2016d_2016i"},
     {"zoneinfo->@2016a/x, tz_latest->@2016b.1", dropped,
      "zoneinfo->@2016b.1/zoneinfo, icutz->@2016b.1/icutz, needs_cleanup=, "
      "TZVersionDiffRecord=2016c.1.0_2016b.1"},
@@ -117,6 +121,7 @@ const struct {
     // Whatever fails ends with the system's data; what was done before that stays.
     {d + "tz_latest=x", "read_symlink: /var/db/timezone/tz_latest\n" + failed,
      system_data + ", icutz!"},
+    {"zoneinfo!, tz_latest=x", "read_symlink: /var/db/timezone/tz_latest\n" + failed, system_data},
     {"zoneinfo->@2016a/x, tz_latest->@9999999999a", dropped + failed,
      system_data + ", needs_cleanup="},
     {d + "tz_latest->@", "kiv_dataset::create_components: bad path /var/db/timezone/tz/\n" + failed,
@@ -200,9 +205,17 @@ TEST(start, gives_later_lines_the_reason_of_the_first) {
 
 TEST(start, makes_the_standard_descriptors_valid) {
     prepare("");
-    ::close(STDIN_FILENO);
-    EXPECT_EQ(program_main(), 0);
-    EXPECT_NE(::fcntl(STDIN_FILENO, F_GETFD), -1);
+    int status = ::fork();
+    if (status == 0) {
+        ::close_range(STDIN_FILENO, STDERR_FILENO, 0);
+        program_main();
+        ::_exit(::dup(STDIN_FILENO) != -1 && ::dup(STDOUT_FILENO) != -1 &&
+                        ::dup(STDERR_FILENO) != -1
+                    ? 0
+                    : 1);
+    }
+    ::wait(&status);
+    EXPECT_EQ(status, 0);
 }
 
 TEST(start, takes_data_protection_off) {

@@ -41,7 +41,7 @@ void drop_current() {
 
 void adopt(const kiv_dataset& latest, const kiv_dataset& effective, const kiv_dataset& system) {
     latest.make_current();
-    if (!(effective == system)) {
+    if (effective != system) {
         touch_needs_cleanup();
     }
     write_version_diff_record(effective, latest);
