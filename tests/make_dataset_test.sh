@@ -38,6 +38,8 @@ make system deb two out/share|two: holds more than one ICU data file
 make system deb misnamed out/share|misnamed/icutz44x.dat: not named like icutz44l.dat
 sh without-zic update deb one out/2016b|zic: not found
 make update deb one none/none/2016b|none/none: cannot be written to
+make update 2016b one out/2016b|2016b: holds no zone
+make system deb -one out/share|-one: begins with '-' or holds a newline
 make update nonsense one out/2016b|nonsense: zic cannot compile it
 PATH=dying:$PATH make update deb one out/2016b|dying
 END
