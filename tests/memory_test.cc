@@ -61,7 +61,8 @@ namespace {
 
 TEST(memory, that_runs_out_at_any_allocation_ends_in_the_fall_back_or_says_so) {
     for (const bool for_good : {false, true}) {
-        for (int nth = 1, made = nth; nth <= made; ++nth) {
+        int made = 1;
+        for (int nth = 1; nth <= made; ++nth) {
             lay_out(
                 parsed("/usr/share/zoneinfo.default/+VERSION=2016c, "
                        "/usr/share/icu/icutzformat.txt=44l, tz/2016d/icutz/icutz44l.dat=, "
@@ -82,6 +83,7 @@ TEST(memory, that_runs_out_at_any_allocation_ends_in_the_fall_back_or_says_so) {
                             : said.ends_with("Could not set all time-zone links\n"))
                 << "allocation " << nth << ": " << said;
         }
+        EXPECT_GT(made, 50); // as a whole start does
     }
 }
 

@@ -17,6 +17,14 @@ namespace tz::test {
 /// with "@" for the directory of updates.
 using tree = std::map<std::string, std::string>;
 
+/// The system at 2016c, and updates that are older, newer and newest, each with its tz database.
+inline const std::string three_updates =
+    "/usr/share/zoneinfo.default/+VERSION=2016c, /usr/share/icu/icutzformat.txt=44l, "
+    "localtime->/var/db/timezone/zoneinfo/Europe/Paris, "
+    "tz/2016a/zoneinfo/+VERSION=2016a, tz/2016a/icutz/icutz44l.dat=, "
+    "tz/2016d/zoneinfo/+VERSION=2016d, tz/2016d/icutz/icutz44l.dat=, "
+    "tz/2016e/zoneinfo/+VERSION=2016e, tz/2016e/icutz/icutz44l.dat=, ";
+
 /// A tree from a text such as "zoneinfo->@2016a/zoneinfo, needs_cleanup=, tz_latest!".
 tree parsed(const std::string& text);
 

@@ -77,7 +77,6 @@ const struct {
 
     // The current update is kept, and so is its lack of an ICU link; or it is dropped.
     {"zoneinfo->@2016c.1.0/zoneinfo", "", ""},
-    {"zoneinfo->@2016d/zoneinfo", "", ""},
     {d + "tz_latest->@2016d", refused + "2016d vs. 2016d\n", ""},
     {"zoneinfo->@2016a/x, /var/db/icutz->/none", dropped,
      system_data + ", needs_cleanup=, /var/db/icutz!"},

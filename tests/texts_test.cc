@@ -1,9 +1,11 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #include <algorithm>
+#include <array>
 #include <cerrno>
 #include <stdexcept>
 
 #include <fcntl.h>
+#include <sys/socket.h>
 #include <unistd.h>
 
 #include "fs/operations.h"
@@ -15,6 +17,7 @@ namespace tz::test {
 namespace {
 
 using namespace std::string_literals;
+
 std::string shown(const data_version& version) {
     return std::to_string(version.year) + " " + version.letters + " " +
            std::to_string(version.minor) + " " + std::to_string(version.patch);
@@ -88,15 +91,25 @@ TEST(word, is_the_first_in_a_regular_file) {
     ::close(writer);
 }
 
-TEST(warning, is_whole_however_long_and_keeps_its_reason_for_the_next) {
-    const std::string name(1 << 20, '%');
-    const auto twice = [&] {
-        errno = ENOENT;
-        warn("%s", name.c_str());
-        warn("%s", name.c_str());
-    };
-    const auto line = name + ": No such file or directory\n";
-    EXPECT_EQ(warnings_of(twice, true), line + line);
+TEST(warning, is_one_write_whatever_is_in_it_and_keeps_its_reason_for_the_next) {
+    std::array<int, 2> ends{};
+    ASSERT_EQ(::socketpair(AF_UNIX, SOCK_SEQPACKET, 0, ends.data()), 0); // one message a write
+    const int saved = ::dup(STDERR_FILENO);
+    ::dup2(ends[1], STDERR_FILENO);
+    const std::string name = "%s\n" + std::string(50000, '%');
+    errno = ENOENT;
+    warn("%s", name.c_str());
+    warn("%s", name.c_str());
+    ::dup2(saved, STDERR_FILENO);
+    ::close(saved);
+    ::close(ends[1]);
+    for (int line = 0; line < 2; ++line) {
+        std::string text(100000, '\0');
+        text.resize(
+            static_cast<std::size_t>(std::max(::read(ends[0], text.data(), text.size()), 0L)));
+        EXPECT_EQ(text, "tzreconcile_tests: " + name + ": No such file or directory\n");
+    }
+    ::close(ends[0]);
 }
 
 } // namespace
