@@ -41,7 +41,7 @@ $updates/?*/?*)
     current=${link%/*}
     version=${current#"$updates"/}
     if [ "$(schema_in "$current/icutz")" = "$schema" ] && ! newer "$release.1.0" "$version"; then
-effective=update
+        effective=update
     else
         warn "Dropping $version"
         make_current $system

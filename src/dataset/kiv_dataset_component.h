@@ -17,8 +17,8 @@ class kiv_dataset_component {
     [[nodiscard]] virtual bool compatible_schema(const kiv_dataset_component& other) const = 0;
 
     /// Makes the system's link for this kind of data name this component. The old link is removed
-    /// first; one that cannot be removed is told by a warning, and creation is tried all the same.
-    /// Throws the `errno` value, an `int`, of a link that could not be created.
+    /// first; one that cannot be removed is reported by a warning, and creation is tried all the
+    /// same. Throws the `errno` value, an `int`, of a link that could not be created.
     virtual void make_current() const = 0;
 
   protected:

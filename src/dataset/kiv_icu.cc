@@ -64,8 +64,9 @@ std::string_view icu_schema_in_name(std::string_view name) {
     }
     const auto schema = name.substr(prefix.size(), name.size() - prefix.size() - suffix.size());
     const auto letter = schema.find_first_not_of("0123456789");
-    const bool well_formed = letter != 0 && letter + 1 == schema.size() &&
-                             std::string_view("lbe").find(schema.back()) != std::string_view::npos;
+    const bool well_formed = letter != 0 && letter != std::string_view::npos &&
+                             letter + 1 == schema.size() &&
+                             std::string_view("lbe").find(schema[letter]) != std::string_view::npos;
     return well_formed ? schema : std::string_view();
 }
 

@@ -6,8 +6,8 @@
 /// The few path operations on which everything else rests. Paths and link targets are byte strings,
 /// handed to the system call as they are: nothing is normalised or resolved.
 ///
-/// A failure that an operation does not tolerate is told by one warning line and then thrown as the
-/// bare `errno` value, an `int`. Callers need no more than the fact of it.
+/// A failure that an operation does not tolerate is reported by one warning line and then thrown as
+/// the bare `errno` value, an `int`. Callers need no more than the fact of it.
 namespace tz::fs {
 
 /// Removes the entry at `path`; of a link the link itself. An absent entry counts as removed. A

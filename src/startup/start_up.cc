@@ -1,29 +1,20 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #include "startup/start_up.h"
 
-#include <cstdio>
 #include <string>
 
 #include "dataset/kiv_dataset.h"
-#include "fs/layout.h"
 #include "platform/warn.h"
 #include "startup/decision.h"
 #include "startup/links.h"
 #include "startup/localtime_link.h"
-#include "startup/state_directories.h"
+#include "startup/preparation.h"
 #include "startup/state_files.h"
 
 namespace tz {
 namespace {
 
-void prepare() {
-    prepare_state_directories();
-    migrate_legacy_icu_link();
-    (void)std::remove(layout::cleanup_marker);
-    (void)std::remove(layout::legacy_icu_directory);
-}
-
-std::string current_dataset_path() {
+std::string current_dataset_path_or_reset() {
     try {
         return read_current_dataset_path();
     } catch (...) {
@@ -50,19 +41,20 @@ void adopt(const kiv_dataset& latest, const kiv_dataset& effective, const kiv_da
 void reconcile() {
     const kiv_dataset system;
     const std::string latest_path = read_latest_link();
-    const kiv_dataset current(current_dataset_path());
+    const kiv_dataset current(current_dataset_path_or_reset());
 
     const bool kept = keep_current(current, system);
     if (!kept) {
         drop_current();
     }
+    const kiv_dataset& effective = kept ? current : system;
     if (latest_path.empty()) {
         return;
     }
 
     const kiv_dataset latest(latest_path);
     if (adopt_latest(latest, current, system)) {
-        adopt(latest, kept ? current : system, system);
+        adopt(latest, effective, system);
     } else {
         warn("New update not compatible or older version: %s vs. %s",
              latest.version_string().c_str(), current.version_string().c_str());

@@ -10,7 +10,7 @@ namespace tz {
 /// The version of a dataset: a release of the tz database, such as 2016a, and the numbers with
 /// which it was shipped, such as .1.0.
 ///
-/// A value without arguments is the unknown version, which is older than every other.
+/// A default-constructed value is the unknown version, which is older than every other.
 struct data_version {
     int year = -1;
     std::string letters;

@@ -1,11 +1,14 @@
 // SPDX-License-Identifier: BSD-2-Clause
-#include "startup/state_directories.h"
+#include "startup/preparation.h"
+
+#include <cstdio>
 
 #include "fs/layout.h"
 #include "fs/operations.h"
 #include "platform/warn.h"
 
 namespace tz {
+namespace {
 
 void prepare_state_directories() {
     fs::set_protection_class(layout::state_directory);
@@ -27,6 +30,15 @@ void migrate_legacy_icu_link() {
             warn("Could not remove %s", layout::legacy_icu_link);
         }
     }
+}
+
+} // namespace
+
+void prepare() {
+    prepare_state_directories();
+    migrate_legacy_icu_link();
+    (void)std::remove(layout::cleanup_marker);
+    (void)std::remove(layout::legacy_icu_directory);
 }
 
 } // namespace tz
