@@ -6,11 +6,11 @@
 #include <cstring>
 #include <memory>
 
-#include <fts.h>
 #include <sys/stat.h>
 
 #include "fs/layout.h"
 #include "fs/operations.h"
+#include "platform/disk.h"
 #include "platform/warn.h"
 
 namespace tz {
@@ -29,7 +29,7 @@ bool is_world_readable_file(const FTSENT& entry) {
 std::string first_schema_in(std::string directory) {
     std::array<char*, 2> roots{directory.data(), nullptr};
     const std::unique_ptr<FTS, walk_closer> walk(
-        ::fts_open(roots.data(), FTS_COMFOLLOW | FTS_PHYSICAL | FTS_XDEV, nullptr));
+        platform::fts_open(roots.data(), FTS_COMFOLLOW | FTS_PHYSICAL | FTS_XDEV));
     if (!walk) {
         warn("tz_icu::initialize: fts_open of %s failed, %s", directory.c_str(),
              std::strerror(errno));

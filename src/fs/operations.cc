@@ -12,6 +12,7 @@
 
 #include "fs/descriptor.h"
 #include "platform/data_protection.h"
+#include "platform/disk.h"
 #include "platform/warn.h"
 
 namespace tz::fs {
@@ -24,7 +25,7 @@ bool is_white_space(char c) {
 } // namespace
 
 void remove(const std::string& path) {
-    if (::unlink(path.c_str()) == 0 || errno == ENOENT) {
+    if (platform::unlink(path.c_str()) == 0 || errno == ENOENT) {
         return;
     }
     warn("remove: could not remove %s", path.c_str());
@@ -32,12 +33,12 @@ void remove(const std::string& path) {
 }
 
 bool exists(const std::string& path) {
-    return ::access(path.c_str(), F_OK) == 0;
+    return platform::access(path.c_str(), F_OK) == 0;
 }
 
 std::string read_symlink(const std::string& path) {
     std::array<char, 1024> target; // NOLINT(*-member-init): readlink fills it
-    const ssize_t length = ::readlink(path.c_str(), target.data(), target.size());
+    const ssize_t length = platform::readlink(path.c_str(), target.data(), target.size());
     if (length >= 0) {
         return {target.data(), static_cast<std::size_t>(length)};
     }
@@ -49,7 +50,7 @@ std::string read_symlink(const std::string& path) {
 }
 
 void create_symlink(const std::string& target, const std::string& link_path) {
-    if (::symlink(target.c_str(), link_path.c_str()) == 0) {
+    if (platform::symlink(target.c_str(), link_path.c_str()) == 0) {
         return;
     }
     warn("create_symlink: from %s to %s", link_path.c_str(), target.c_str());
@@ -57,7 +58,7 @@ void create_symlink(const std::string& target, const std::string& link_path) {
 }
 
 void set_protection_class(const std::string& path) {
-    const descriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC));
+    const descriptor file(platform::open(path.c_str(), O_RDONLY | O_CLOEXEC));
     if (file.is_open()) {
         platform::set_protection_class(file.number(), platform::class_without_protection);
     }
@@ -65,7 +66,8 @@ void set_protection_class(const std::string& path) {
 
 std::string read_word(const std::string& path) {
     // Non-blocking, for a FIFO without a writer would hold up the start for ever.
-    const descriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY));
+    const descriptor file(
+        platform::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY));
     struct stat status {};
     if (!file.is_open() || ::fstat(file.number(), &status) == -1 || !S_ISREG(status.st_mode)) {
         return {};

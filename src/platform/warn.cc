@@ -41,8 +41,9 @@ void warn(const char* format, ...) {
     std::va_list values;
     va_start(values, format);
     try {
-        const std::string line = std::string(__progname) + ": " + formatted(format, values) + ": " +
-                                 std::strerror(reason) + "\n";
+        std::string line = __progname;
+        line.append(": ").append(formatted(format, values));
+        line.append(": ").append(std::strerror(reason)).append("\n");
         [[maybe_unused]] const auto written = ::write(STDERR_FILENO, line.data(), line.size());
     } catch (const std::bad_alloc&) {
         errno = reason;

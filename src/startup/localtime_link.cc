@@ -1,20 +1,20 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #include "startup/localtime_link.h"
 
-#include <cstdio>
 #include <string>
 #include <string_view>
 
 #include "fs/layout.h"
 #include "fs/operations.h"
+#include "platform/disk.h"
 #include "platform/warn.h"
 
 namespace tz {
 namespace {
 
 void replace_localtime_link(const std::string& target) {
-    // The C library's remove says nothing of its own, and deletes an empty directory, too.
-    (void)std::remove(layout::localtime_link);
+    // Unlike fs::remove, this says nothing of its own, and deletes an empty directory, too.
+    (void)platform::remove(layout::localtime_link);
     fs::create_symlink(target, layout::localtime_link);
 }
 

@@ -1,10 +1,9 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #include "startup/preparation.h"
 
-#include <cstdio>
-
 #include "fs/layout.h"
 #include "fs/operations.h"
+#include "platform/disk.h"
 #include "platform/warn.h"
 
 namespace tz {
@@ -37,8 +36,8 @@ void migrate_legacy_icu_link() {
 void prepare() {
     prepare_state_directories();
     migrate_legacy_icu_link();
-    (void)std::remove(layout::cleanup_marker);
-    (void)std::remove(layout::legacy_icu_directory);
+    (void)platform::remove(layout::cleanup_marker);
+    (void)platform::remove(layout::legacy_icu_directory);
 }
 
 } // namespace tz

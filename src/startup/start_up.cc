@@ -18,14 +18,14 @@ std::string current_dataset_path_or_reset() {
     try {
         return read_current_dataset_path();
     } catch (...) {
-        warn("Invalid current symlinks; resetting to system partition");
+        warn(messages::invalid_links);
         reset_to_system_partition();
         return {};
     }
 }
 
 void drop_current() {
-    warn("Symlink points at data incompatible with installed system");
+    warn(messages::dropped);
     reset_to_system_partition();
     touch_needs_cleanup();
 }
@@ -68,7 +68,7 @@ void start_up() {
     try {
         reconcile();
     } catch (...) {
-        warn("Unable to locate data; resetting to system partition");
+        warn(messages::fell_back);
         reset_to_system_partition();
     }
     repair_localtime_link();

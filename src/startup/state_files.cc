@@ -10,6 +10,7 @@
 #include "fs/descriptor.h"
 #include "fs/layout.h"
 #include "platform/data_protection.h"
+#include "platform/disk.h"
 #include "platform/warn.h"
 
 namespace tz {
@@ -26,8 +27,8 @@ void touch_needs_cleanup() {
 void write_version_diff_record(const kiv_dataset& effective, const kiv_dataset& latest) {
     const std::string text = effective.version_string() + "_" + latest.version_string();
     const fs::descriptor record(
-        ::open(layout::version_diff_record,
-               O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NONBLOCK | O_NOCTTY, 0666));
+        platform::open(layout::version_diff_record,
+                       O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NONBLOCK | O_NOCTTY, 0666));
     if (record.is_open()) {
         [[maybe_unused]] const auto written = ::write(record.number(), text.data(), text.size());
     }

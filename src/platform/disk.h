@@ -1,0 +1,24 @@
+// SPDX-License-Identifier: BSD-2-Clause
+#pragma once
+
+#include <cstddef>
+
+#include <fts.h>
+#include <sys/types.h>
+
+/// The few calls with which a start looks at the disk and changes it. Each is the call of the C
+/// library that it is named after: arguments, results and `errno` are the same.
+///
+/// They exist twice, and the linker picks: in disk.cc for the program that starts machines; and as
+/// an imagination in tzctl, which thus foretells a start by letting it run.
+namespace tz::platform {
+
+int access(const char* path, int mode);
+ssize_t readlink(const char* path, char* buffer, std::size_t size);
+int symlink(const char* target, const char* link_path);
+int unlink(const char* path);
+int remove(const char* path);
+int open(const char* path, int flags, mode_t mode = 0);
+FTS* fts_open(char* const* roots, int options);
+
+} // namespace tz::platform
