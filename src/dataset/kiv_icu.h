@@ -23,6 +23,9 @@ class kiv_icu final : public kiv_dataset_component {
     /// value, an `int`, after a warning line, if the update's directory cannot be walked at all.
     explicit kiv_icu(const std::string& dataset_path);
 
+    /// The schema; empty if none was found.
+    [[nodiscard]] const std::string& schema() const { return schema_; }
+
     /// Whether both schemas are the same, byte for byte. False, with a warning line, if `other` is
     /// of another kind.
     [[nodiscard]] bool compatible_schema(const kiv_dataset_component& other) const override;

@@ -1,0 +1,137 @@
+// SPDX-License-Identifier: BSD-2-Clause
+#include "ctl/install.h"
+
+#include <cerrno>
+#include <iostream>
+#include <system_error>
+
+#include <fcntl.h>
+#include <unistd.h>
+
+#include "ctl/imagination.h"
+#include "ctl/prediction.h"
+#include "ctl/text.h"
+#include "ctl/updates.h"
+#include "fs/descriptor.h"
+#include "fs/layout.h"
+#include "platform/disk.h"
+#include "version/data_version.h"
+
+namespace tz {
+namespace {
+
+namespace files = std::filesystem;
+using updates::refusal;
+
+// Deletes what is half-made.
+struct staging {
+    staging() { files::remove_all(updates::staging_directory()); }
+    staging(const staging&) = delete;
+    staging& operator=(const staging&) = delete;
+    ~staging() {
+        std::error_code none;
+        files::remove_all(updates::staging_directory(), none);
+    }
+};
+
+void check_name(const std::string& version, bool forced) {
+    if (!split_version(version) && !forced) {
+        throw refusal(version + " is not a version such as 2016b.1.0");
+    }
+    if (files::exists(files::symlink_status(updates::path_of(version)))) {
+        throw refusal(version + " is installed already: see tzctl use");
+    }
+}
+
+void flush(const files::path& path) {
+    const fs::descriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC));
+    if (!file.is_open() || ::fsync(file.number()) == -1) {
+        throw std::system_error(errno, std::generic_category(), path);
+    }
+}
+
+void copy_entry(const files::directory_entry& entry, const files::path& copy) {
+    if (entry.is_symlink()) {
+        files::copy_symlink(entry.path(), copy);
+    } else if (entry.is_directory()) {
+        files::create_directory(copy);
+        files::permissions(copy, files::perms(0755));
+    } else if (entry.is_regular_file()) {
+        files::copy_file(entry.path(), copy);
+        files::permissions(copy, files::perms(0644));
+        flush(copy);
+    } else {
+        throw refusal(entry.path().string() + " is not a file, a directory or a link");
+    }
+}
+
+void copy_dataset(const files::path& source, const updates::work& work) {
+    const auto staged = updates::staging_directory();
+    copy_entry(files::directory_entry(source), staged);
+    for (const auto& entry : files::recursive_directory_iterator(source)) {
+        work.go_on();
+        copy_entry(entry, staged / entry.path().lexically_relative(source));
+    }
+    for (const auto& entry : files::recursive_directory_iterator(staged)) {
+        if (entry.is_directory() && !entry.is_symlink()) {
+            flush(entry.path());
+        }
+    }
+    flush(staged);
+}
+
+// What a start would do if the staged dataset were in place and the latest.
+prediction predict_with_staged(const std::string& place) {
+    imagination::forget();
+    (void)platform::unlink(layout::latest_link);
+    if (platform::symlink(place.c_str(), layout::latest_link) == -1 ||
+        platform::symlink(updates::staging_directory().c_str(), place.c_str()) == -1) {
+        throw std::system_error(errno, std::generic_category(), layout::latest_link);
+    }
+    return predict_start();
+}
+
+void check_adoption(const prediction& start, const std::string& place) {
+    if (start.decided != decision::adopt || start.dataset != place) {
+        throw refusal("the next start would not adopt it. " + start.reason);
+    }
+    if (!updates::holds_zones(updates::staging_directory() /
+                              files::path(layout::update_zoneinfo).relative_path())) {
+        throw refusal("it holds no tz database, and every time zone would be UTC");
+    }
+}
+
+void publish(const std::string& place) {
+    const auto staged = updates::staging_directory();
+    files::rename(staged, place);
+    try {
+        flush(layout::updates_directory);
+        updates::replace_link(place, layout::latest_link);
+    } catch (...) {
+        files::rename(place, staged);
+        throw;
+    }
+    ::sync();
+}
+
+} // namespace
+
+void install(const files::path& source, const std::string& version, bool forced) {
+    const updates::work work;
+    check_name(version, forced);
+    const staging guard;
+    copy_dataset(source, work);
+
+    const std::string place = updates::path_of(version);
+    const auto start = predict_with_staged(place);
+    if (!forced) {
+        check_adoption(start, place);
+    }
+    work.go_on();
+    publish(place);
+    std::cout << "Installed update " << printable(version) << ". The next start "
+              << printable(headline(start)) << ".\n"
+              << wrapped(printable(start.reason));
+}
+
+} // namespace tz

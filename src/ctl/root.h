@@ -1,0 +1,13 @@
+// SPDX-License-Identifier: BSD-2-Clause
+#pragma once
+
+#include <string>
+
+namespace tz {
+
+/// Makes `directory`, a mounted or unpacked image, the root directory of this process, so that
+/// every path and every link leads to somewhere inside. An ordinary user, who may not do that, does
+/// it in a user namespace. Throws std::system_error.
+void enter_root(const std::string& directory);
+
+} // namespace tz

@@ -1,0 +1,173 @@
+// SPDX-License-Identifier: BSD-2-Clause
+#include "ctl/updates.h"
+
+#include <algorithm>
+#include <array>
+#include <cerrno>
+#include <fstream>
+#include <set>
+#include <string_view>
+#include <system_error>
+
+#include <fcntl.h>
+#include <sys/file.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include "ctl/prediction.h"
+#include "fs/layout.h"
+
+namespace tz::updates {
+namespace {
+
+namespace files = std::filesystem;
+
+constexpr std::array ending_signals{SIGHUP, SIGINT, SIGTERM};
+
+std::system_error failure(const std::string& what) {
+    return {errno, std::generic_category(), what};
+}
+
+// Whether `path` is `directory` or lies below it.
+bool is_within(const files::path& path, const files::path& directory) {
+    return std::mismatch(directory.begin(), directory.end(), path.begin(), path.end()).first ==
+           directory.end();
+}
+
+// Where the links of the state directory lead, as far as that exists.
+std::vector<files::path> led_to() {
+    std::vector<files::path> places;
+    for (const auto* link :
+         {layout::zoneinfo_link, layout::icu_link, layout::latest_link, layout::localtime_link}) {
+        if (const auto target = target_of(link)) {
+            places.push_back(
+                files::weakly_canonical(layout::state_directory / files::path(*target)));
+        }
+    }
+    return places;
+}
+
+bool is_zone_file(const files::directory_entry& entry) {
+    constexpr std::string_view magic = "TZif";
+    std::array<char, magic.size()> start{};
+    std::error_code none;
+    return entry.is_regular_file(none) &&
+           std::ifstream(entry.path()).read(start.data(), start.size()) &&
+           std::string_view(start.data(), start.size()) == magic;
+}
+
+} // namespace
+
+files::path staging_directory() {
+    return files::path(layout::updates_directory) / ".tzctl";
+}
+
+std::string path_of(const std::string& version) {
+    return layout::updates_directory + version;
+}
+
+std::vector<files::path> installed() {
+    std::vector<files::path> found;
+    std::error_code none;
+    for (const auto& entry : files::directory_iterator(layout::updates_directory, none)) {
+        if (entry.is_directory(none) && entry.path() != staging_directory()) {
+            found.push_back(entry.path());
+        }
+    }
+    return found;
+}
+
+std::vector<files::path> removable() {
+    if (!current_dataset_path()) {
+        throw refusal("the current link cannot be read, so nothing is known to be unused");
+    }
+    if (files::exists(files::symlink_status(layout::latest_link)) &&
+        !target_of(layout::latest_link)) {
+        throw refusal("the latest link cannot be read, so nothing is known to be unused");
+    }
+    if (files::is_symlink(files::path(layout::updates_directory).parent_path())) {
+        throw refusal("the directory of updates is a link, through which nothing is deleted");
+    }
+    const auto in_use = led_to();
+    auto found = installed();
+    std::erase_if(found, [&](const auto& directory) {
+        const auto holds = [&](const auto& place) {
+            return is_within(place, files::canonical(directory));
+        };
+        return files::is_symlink(directory) || std::any_of(in_use.begin(), in_use.end(), holds);
+    });
+    return found;
+}
+
+bool holds_zones(const files::path& directory) {
+    std::error_code none;
+    const files::recursive_directory_iterator entries(
+        directory, files::directory_options::skip_permission_denied, none);
+    return std::any_of(begin(entries), end(entries), is_zone_file);
+}
+
+void replace_link(const std::string& target, const files::path& path) {
+    const auto beside = files::path(path) += ".tzctl";
+    files::remove(beside);
+    files::create_symlink(target, beside);
+    try {
+        files::rename(beside, path);
+    } catch (...) {
+        files::remove(beside);
+        throw;
+    }
+}
+
+std::uintmax_t size_of(const files::path& directory) {
+    std::uintmax_t bytes = 0;
+    std::set<std::pair<dev_t, ino_t>> counted; // a file may have several names
+    for (const auto& entry : files::recursive_directory_iterator(directory)) {
+        struct stat status {};
+        if (::lstat(entry.path().c_str(), &status) == 0 &&
+            counted.emplace(status.st_dev, status.st_ino).second) {
+            bytes += static_cast<std::uintmax_t>(status.st_blocks) * 512;
+        }
+    }
+    return bytes;
+}
+
+std::uintmax_t remove_update(const files::path& directory) {
+    const auto bytes = size_of(directory);
+    files::rename(directory, staging_directory());
+    files::remove_all(staging_directory());
+    return bytes;
+}
+
+work::work() : lock_(::open(layout::state_directory, O_RDONLY | O_DIRECTORY | O_CLOEXEC)) {
+    if (!lock_.is_open()) {
+        throw failure(layout::state_directory);
+    }
+    if (::flock(lock_.number(), LOCK_EX | LOCK_NB) == -1) {
+        if (errno == EWOULDBLOCK) {
+            throw refusal("another tzctl is at work");
+        }
+        throw failure(layout::state_directory);
+    }
+    sigset_t signals;
+    ::sigemptyset(&signals);
+    for (const int signal : ending_signals) {
+        ::sigaddset(&signals, signal);
+    }
+    ::sigprocmask(SIG_BLOCK, &signals, &before_);
+}
+
+work::~work() {
+    ::sigprocmask(SIG_SETMASK, &before_, nullptr);
+}
+
+void work::go_on() const {
+    sigset_t pending;
+    ::sigpending(&pending);
+    for (const int signal : ending_signals) {
+        if (::sigismember(&pending, signal) == 1) {
+            throw refusal("interrupted");
+        }
+    }
+}
+
+} // namespace tz::updates

@@ -1,0 +1,66 @@
+// SPDX-License-Identifier: BSD-2-Clause
+#pragma once
+
+#include <filesystem>
+#include <stdexcept>
+#include <string>
+#include <vector>
+
+#include <csignal>
+
+#include "fs/descriptor.h"
+
+/// What the updater's verbs do to the disk, in earnest. Failures are thrown as std::exception,
+/// whose text is for people.
+namespace tz::updates {
+
+/// What was asked for will not be done.
+struct refusal : std::runtime_error {
+    using std::runtime_error::runtime_error;
+};
+
+/// Where a directory of updates keeps what is half-made or half-deleted. Whoever is at work may
+/// delete it.
+[[nodiscard]] std::filesystem::path staging_directory();
+
+/// The directory of the update of this version; the path of the system's own data is empty.
+[[nodiscard]] std::string path_of(const std::string& version);
+
+/// The directories of the installed updates, also where that is a link to a directory.
+[[nodiscard]] std::vector<std::filesystem::path> installed();
+
+/// The installed updates into which no link of the state directory leads, and that are directories
+/// themselves. Throws a refusal while that cannot be told.
+[[nodiscard]] std::vector<std::filesystem::path> removable();
+
+/// Whether there is a compiled zone file in `directory` or below.
+[[nodiscard]] bool holds_zones(const std::filesystem::path& directory);
+
+/// Makes the link `path` say `target`, in one step: nobody ever finds no link there.
+void replace_link(const std::string& target, const std::filesystem::path& path);
+
+/// Deletes `directory` and all below it; whoever looks finds all of it or nothing. Returns how many
+/// bytes that gives back.
+std::uintmax_t remove_update(const std::filesystem::path& directory);
+
+/// How many bytes the files in `directory` and below take.
+[[nodiscard]] std::uintmax_t size_of(const std::filesystem::path& directory);
+
+/// As long as this lives, no other tzctl changes anything, and neither an interruption from the
+/// keyboard nor a request to terminate ends this one before it has put things in order.
+class work {
+  public:
+    work();
+    work(const work&) = delete;
+    work& operator=(const work&) = delete;
+    ~work();
+
+    /// Throws if somebody wants this to end.
+    void go_on() const;
+
+  private:
+    fs::descriptor lock_;
+    sigset_t before_{};
+};
+
+} // namespace tz::updates
