@@ -1,26 +1,29 @@
 // SPDX-License-Identifier: BSD-2-Clause
-#include "ctl/cleanup.h"
-
 #include <filesystem>
 #include <iostream>
 
 #include "ctl/text.h"
 #include "ctl/updates.h"
+#include "ctl/verbs.h"
 
 namespace tz {
 
-void clean_up(bool rehearsal) {
+void clean_up(bool rehearsed) {
     const updates::work work;
+    const auto removable = updates::removable();
+    if (!rehearsed) {
+        std::filesystem::remove_all(updates::staging_directory());
+    }
     std::uintmax_t freed = 0;
-    for (const auto& directory : updates::removable()) {
+    for (const auto& directory : removable) {
         work.go_on();
         const auto bytes =
-            rehearsal ? updates::size_of(directory) : updates::remove_update(directory);
-        std::cout << (rehearsal ? "Would delete update " : "Deleted update ")
+            rehearsed ? updates::size_of(directory) : updates::remove_update(directory);
+        std::cout << (rehearsed ? "Would delete update " : "Deleted update ")
                   << printable(directory.filename().string()) << ": " << amount(bytes) << std::endl;
         freed += bytes;
     }
-    std::cout << (rehearsal ? "That would give back " : "That gives back ") << amount(freed)
+    std::cout << (rehearsed ? "That would give back " : "That gives back ") << amount(freed)
               << ".\n";
 }
 

@@ -1,6 +1,4 @@
 // SPDX-License-Identifier: BSD-2-Clause
-#include "ctl/install.h"
-
 #include <cerrno>
 #include <iostream>
 #include <system_error>
@@ -8,13 +6,14 @@
 #include <fcntl.h>
 #include <unistd.h>
 
-#include "ctl/imagination.h"
 #include "ctl/prediction.h"
 #include "ctl/text.h"
 #include "ctl/updates.h"
+#include "ctl/verbs.h"
 #include "fs/descriptor.h"
 #include "fs/layout.h"
 #include "platform/disk.h"
+#include "platform/imagination.h"
 #include "version/data_version.h"
 
 namespace tz {
@@ -35,8 +34,8 @@ struct staging {
 };
 
 void check_name(const std::string& version, bool forced) {
-    if (!split_version(version) && !forced) {
-        throw refusal(version + " is not a version such as 2016b.1.0");
+    if (version.empty() || version[0] == '.' || !(forced || split_version(version))) {
+        throw refusal("\"" + version + "\" is not a version such as 2016b.1.0");
     }
     if (files::exists(files::symlink_status(updates::path_of(version)))) {
         throw refusal(version + " is installed already: see tzctl use");
@@ -50,34 +49,23 @@ void flush(const files::path& path) {
     }
 }
 
-void copy_entry(const files::directory_entry& entry, const files::path& copy) {
-    if (entry.is_symlink()) {
-        files::copy_symlink(entry.path(), copy);
-    } else if (entry.is_directory()) {
-        files::create_directory(copy);
-        files::permissions(copy, files::perms(0755));
-    } else if (entry.is_regular_file()) {
-        files::copy_file(entry.path(), copy);
-        files::permissions(copy, files::perms(0644));
-        flush(copy);
-    } else {
-        throw refusal(entry.path().string() + " is not a file, a directory or a link");
+// Readable by everybody, and on the disk.
+void settle(const files::directory_entry& entry) {
+    if (!entry.is_symlink()) {
+        files::permissions(entry, files::perms(entry.is_directory() ? 0755 : 0644));
+        flush(entry);
     }
 }
 
-void copy_dataset(const files::path& source, const updates::work& work) {
+void stage(const files::path& source, const updates::work& work) {
     const auto staged = updates::staging_directory();
-    copy_entry(files::directory_entry(source), staged);
-    for (const auto& entry : files::recursive_directory_iterator(source)) {
-        work.go_on();
-        copy_entry(entry, staged / entry.path().lexically_relative(source));
-    }
+    files::copy(source, staged,
+                files::copy_options::recursive | files::copy_options::copy_symlinks);
     for (const auto& entry : files::recursive_directory_iterator(staged)) {
-        if (entry.is_directory() && !entry.is_symlink()) {
-            flush(entry.path());
-        }
+        work.go_on();
+        settle(entry);
     }
-    flush(staged);
+    settle(files::directory_entry(staged));
 }
 
 // What a start would do if the staged dataset were in place and the latest.
@@ -120,7 +108,7 @@ void install(const files::path& source, const std::string& version, bool forced)
     const updates::work work;
     check_name(version, forced);
     const staging guard;
-    copy_dataset(source, work);
+    stage(source, work);
 
     const std::string place = updates::path_of(version);
     const auto start = predict_with_staged(place);

@@ -1,12 +1,12 @@
 // SPDX-License-Identifier: BSD-2-Clause
-#include "ctl/make.h"
-
 #include <cerrno>
 #include <csignal>
 #include <filesystem>
 #include <system_error>
 
 #include <unistd.h>
+
+#include "ctl/verbs.h"
 
 namespace tz {
 

@@ -2,12 +2,14 @@
 #include "ctl/survey.h"
 
 #include <algorithm>
+#include <array>
+#include <filesystem>
 #include <fstream>
 #include <iterator>
+#include <optional>
 #include <stdexcept>
-#include <system_error>
+#include <string>
 
-#include "ctl/imagination.h"
 #include "ctl/text.h"
 #include "ctl/updates.h"
 #include "dataset/kiv_dataset.h"
@@ -15,154 +17,159 @@
 #include "dataset/kiv_zoneinfo.h"
 #include "fs/layout.h"
 #include "fs/operations.h"
+#include "platform/imagination.h"
 #include "platform/warn.h"
 
 namespace tz {
 namespace {
 
 namespace files = std::filesystem;
+using nlohmann::ordered_json;
 
-std::optional<std::string> unless_empty(const std::string& text) {
-    return text.empty() ? std::nullopt : std::optional(text);
+ordered_json text_or_null(const std::optional<std::string>& text) {
+    return text ? ordered_json(in_utf8(*text)) : ordered_json();
 }
 
-// What can be told of a dataset, also of one whose version a start cannot read; nothing if the path
-// names none.
-std::optional<dataset_report> report_on(const std::string& path, const kiv_dataset* system) {
-    dataset_report report;
+ordered_json word_or_null(const std::string& word) {
+    return word.empty() ? ordered_json() : ordered_json(in_utf8(word));
+}
+
+// A dataset, also one whose version a start cannot read; null if the path names none.
+ordered_json describe(const std::string& path, const kiv_dataset* system) {
+    std::string version = files::path(path).filename();
+    bool newer = false;
     try {
         const kiv_dataset dataset(path);
-        report.version = dataset.version_string();
-        report.newer_than_system = system != nullptr && dataset > *system;
+        version = dataset.version_string();
+        newer = system != nullptr && dataset > *system;
     } catch (const std::out_of_range&) {
-        report.version = files::path(path).filename();
-        warn("%s: its version holds a number beyond 2147483647", path.c_str());
+        warn("%s: the version holds a number beyond 2147483647", version.c_str());
     } catch (...) {
-        return std::nullopt;
+        return nullptr;
     }
     const kiv_icu icu(path);
-    report.path = path;
-    report.release = unless_empty(kiv_zoneinfo(path).version());
-    report.schema = unless_empty(icu.schema());
-    report.compatible = icu.compatible_schema(kiv_icu());
-    return report;
+    return {{"path", in_utf8(path)},
+            {"version", in_utf8(version)},
+            {"release", word_or_null(kiv_zoneinfo(path).version())},
+            {"schema", word_or_null(icu.schema())},
+            {"compatible", icu.compatible_schema(kiv_icu())},
+            {"newer_than_system", newer}};
 }
 
-link_report report_on_link(const char* path) {
-    link_report report{path, target_of(path), "ok"};
-    std::error_code none;
-    if (!report.target) {
-        const bool missing = !files::exists(files::symlink_status(path, none));
-        report.state = missing ? "missing" : "not a link";
-    } else if (!fs::exists(path)) {
-        report.state = "dangling";
-    }
-    return report;
-}
-
-// Of no known form is as old as it gets, and so is what is too large.
-data_version version_of(const dataset_report& report) {
+data_version version_of(const ordered_json& dataset) {
     try {
-        return data_version(report.version);
+        return data_version(dataset["version"]);
     } catch (const std::out_of_range&) {
-        return {};
+        return {}; // as old as those of no known form
     }
 }
 
-bool is_newer(const dataset_report& left, const dataset_report& right) {
-    const auto left_version = version_of(left);
-    const auto right_version = version_of(right);
-    return left_version == right_version ? left.version < right.version
-                                         : left_version > right_version;
+bool is_newer(const ordered_json& left, const ordered_json& right) {
+    const auto mine = version_of(left);
+    const auto theirs = version_of(right);
+    return mine == theirs ? left["version"] < right["version"] : mine > theirs;
 }
 
-std::vector<dataset_report> report_on_installed(const kiv_dataset* system) {
-    std::vector<dataset_report> reports;
+ordered_json describe_installed(const kiv_dataset* system) {
+    ordered_json datasets = ordered_json::array();
     for (const auto& directory : updates::installed()) {
-        reports.push_back(report_on(directory, system).value());
+        datasets.push_back(describe(directory, system));
     }
-    std::sort(reports.begin(), reports.end(), is_newer);
-    return reports;
+    std::sort(datasets.begin(), datasets.end(), is_newer);
+    return datasets;
 }
 
-std::optional<std::string> text_in(const char* path) {
+ordered_json describe_link(const char* path) {
+    const auto target = target_of(path);
+    std::error_code none;
+    const bool missing = !files::exists(files::symlink_status(path, none));
+    const char* const state = missing             ? "missing"
+                              : !target           ? "not a link"
+                              : !fs::exists(path) ? "dangling"
+                                                  : "ok";
+    return {{"path", path}, {"target", text_or_null(target)}, {"state", state}};
+}
+
+ordered_json describe_start(const prediction& start) {
+    constexpr std::array decisions{"keep", "adopt", "drop", "reset", "fail"};
+    const bool fails = start.decided == decision::fail;
+    return {{"decision", decisions.at(static_cast<std::size_t>(start.decided))},
+            {"dataset", text_or_null(fails ? std::nullopt : start.dataset)},
+            {"icutz", text_or_null(start.icutz)},
+            {"localtime", text_or_null(start.localtime)},
+            {"changes", start.changes},
+            {"reason", in_utf8(start.reason)}};
+}
+
+ordered_json text_in(const char* path) {
     std::error_code none;
     if (!files::is_regular_file(path, none)) {
-        return std::nullopt;
+        return nullptr;
     }
     std::ifstream file(path);
-    return std::string(std::istreambuf_iterator(file), {});
+    return in_utf8(std::string(std::istreambuf_iterator(file), {}));
 }
 
-// What no message of a start tells.
-void add_findings(survey& found) {
-    const auto add = [&](const std::string& finding) { found.findings.push_back(finding); };
-    const std::string update_icu = found.current ? found.current->path + layout::update_icu : "";
-
-    if (found.system && !updates::holds_zones(layout::system_zoneinfo)) {
-        add("The system has no tz database of its own in " + std::string(layout::system_zoneinfo) +
-            ".");
-    }
-    if (found.current && !found.current->path.empty()) {
-        if (found.icutz.target != update_icu) {
-            add("The ICU link does not lead to the data of the current update: \"tzctl use " +
-                found.current->version + "\" mends that.");
+// The lines said while datasets were looked at, some of them twice; and what no start says.
+ordered_json findings(const ordered_json& found, const std::optional<std::string>& current) {
+    ordered_json all = ordered_json::array();
+    const auto add = [&all](bool holds, const std::string& finding) {
+        if (holds && std::find(all.begin(), all.end(), in_utf8(finding)) == all.end()) {
+            all.push_back(in_utf8(finding));
         }
-    } else if (found.current && found.icutz.state != "missing") {
-        add("The ICU link has been left behind, though the system's own data is current: \"tzctl "
-            "use system\" mends that.");
+    };
+    for (const auto& line : imagination::take_warnings()) {
+        add(true, line);
     }
-    if (found.current && !found.current->path.empty() &&
-        !updates::holds_zones(found.current->path + layout::update_zoneinfo)) {
-        add("The current update holds no zone file: every time zone is UTC.");
-    }
-    if (found.tz_latest.state == "dangling") {
-        add("The latest link leads nowhere.");
-    }
-    if (found.localtime.state == "dangling") {
-        add("The local-time link leads to no zone file, so local time is UTC: " +
-            *found.localtime.target + ".");
-    }
+    const auto& links = found["links"];
+    const bool update = current && !current->empty();
+    add(!updates::holds_zones(layout::system_zoneinfo),
+        std::string("There is no zone file in ") + layout::system_zoneinfo + ".");
+    add(update && !updates::holds_zones(*current + layout::update_zoneinfo),
+        "The current update holds no zone file: every time zone is UTC.");
+    add(update && target_of(layout::icu_link) != *current + layout::update_icu,
+        "The ICU link does not lead into the current update: tzctl use mends that.");
+    add(current && !update && links["icutz"]["state"] != "missing",
+        "The ICU link has been left behind, for the system's own data is current: tzctl use system "
+        "mends that.");
+    add(links["tz_latest"]["state"] == "dangling", "The latest link leads nowhere.");
+    add(links["localtime"]["state"] == "dangling",
+        "The local-time link leads to no zone file: local time is UTC.");
+    return all;
 }
 
 } // namespace
 
-survey take_survey() {
+ordered_json survey(prediction& next_start) {
     imagination::forget();
-    survey found;
     std::optional<kiv_dataset> system;
     try {
         system.emplace();
-        found.system = report_on("", &*system);
     } catch (...) {
-        warn("A start cannot use the system's own data");
+        warn("No start can use the system's own data");
     }
     const kiv_dataset* const reference = system ? &*system : nullptr;
-    if (const auto path = current_dataset_path()) {
-        found.current = report_on(*path, reference);
-    }
-    if (const auto path = target_of(layout::latest_link)) {
-        found.latest = report_on(*path, reference);
-    }
-    found.installed = report_on_installed(reference);
-    found.zoneinfo = report_on_link(layout::zoneinfo_link);
-    found.icutz = report_on_link(layout::icu_link);
-    found.tz_latest = report_on_link(layout::latest_link);
-    found.localtime = report_on_link(layout::localtime_link);
-    found.marker = fs::exists(layout::cleanup_marker);
-    found.record = text_in(layout::version_diff_record);
-
-    for (auto& line : imagination::take_warnings()) { // some were said twice
-        if (std::find(found.findings.begin(), found.findings.end(), line) == found.findings.end()) {
-            found.findings.push_back(std::move(line));
-        }
-    }
-    add_findings(found);
-    found.next_start = predict_start();
-    if (found.localtime.state == "ok" && !fs::exists(layout::localtime_link)) {
-        found.findings.push_back(
-            "The data that the next start makes current lacks the local zone: " +
-            found.next_start.localtime.value_or("") + ".");
+    const auto current = current_dataset_path();
+    const auto latest = target_of(layout::latest_link);
+    ordered_json found{{"format", 1},
+                       {"system", system ? describe("", reference) : nullptr},
+                       {"current", current ? describe(*current, reference) : nullptr},
+                       {"latest", latest ? describe(*latest, reference) : nullptr},
+                       {"installed", describe_installed(reference)},
+                       {"links",
+                        {{"zoneinfo", describe_link(layout::zoneinfo_link)},
+                         {"icutz", describe_link(layout::icu_link)},
+                         {"tz_latest", describe_link(layout::latest_link)},
+                         {"localtime", describe_link(layout::localtime_link)}}},
+                       {"marker", fs::exists(layout::cleanup_marker)},
+                       {"record", text_in(layout::version_diff_record)},
+                       {"next_start", nullptr},
+                       {"findings", nullptr}};
+    found["findings"] = findings(found, current);
+    next_start = predict_start();
+    found["next_start"] = describe_start(next_start);
+    if (found["links"]["localtime"]["state"] == "ok" && !fs::exists(layout::localtime_link)) {
+        found["findings"].push_back("The next start makes data current that lacks the local zone.");
     }
     return found;
 }

@@ -5,107 +5,83 @@
 #include <array>
 #include <cstdio>
 #include <sstream>
+#include <string_view>
 
-#include "dataset/kiv_dataset.h"
+#include <utf8.h>
+
 #include "fs/layout.h"
 
 namespace tz {
 namespace {
 
-// How many bytes of `text`, at its front, are one character in UTF-8; 0 if none are.
-std::size_t character_length(std::string_view text) {
-    const auto byte = [&](std::size_t i) { return static_cast<unsigned char>(text[i]); };
-    const std::size_t length = byte(0) < 0x80 ? 1 : byte(0) < 0xe0 ? 2 : byte(0) < 0xf0 ? 3 : 4;
-    if (length == 1) {
-        return 1;
-    }
-    if (byte(0) < 0xc2 || byte(0) > 0xf4 || text.size() < length) {
-        return 0;
-    }
-    unsigned code = byte(0) & (0xffU >> (length + 1));
-    for (std::size_t i = 1; i < length; ++i) {
-        if ((byte(i) & 0xc0U) != 0x80) {
-            return 0;
-        }
-        code = code << 6U | (byte(i) & 0x3fU);
-    }
-    constexpr std::array<unsigned, 5> smallest{0, 0, 0x80, 0x800, 0x10000};
-    const bool surrogate = code >= 0xd800 && code <= 0xdfff;
-    return code >= smallest.at(length) && code <= 0x10ffff && !surrogate ? length : 0;
-}
-
-// C0, DEL, and C1 as UTF-8 has them.
-bool is_control(std::string_view character) {
-    const auto first = static_cast<unsigned char>(character[0]);
-    return first < 0x20 || first == 0x7f ||
-           (first == 0xc2 && static_cast<unsigned char>(character[1]) < 0xa0);
-}
-
-std::string hexadecimal(std::string_view bytes) {
-    std::string result;
-    for (const char byte : bytes) {
-        std::array<char, 5> text{};
-        (void)std::snprintf(text.data(), text.size(), "\\x%02x",
-                            static_cast<unsigned>(static_cast<unsigned char>(byte)));
-        result += text.data();
-    }
-    return result;
-}
-
-std::string escaped(std::string_view text, bool controls_too) {
-    std::string result;
-    while (!text.empty()) {
-        const auto length = character_length(text);
-        const auto character = text.substr(0, std::max<std::size_t>(length, 1));
-        const bool plain = length != 0 && !(controls_too && is_control(character));
-        result += plain ? std::string(character) : hexadecimal(character);
-        text.remove_prefix(character.size());
-    }
-    return result;
+std::string hexadecimal(char byte) {
+    std::array<char, 5> text{};
+    (void)std::snprintf(text.data(), text.size(), "\\x%02x",
+                        static_cast<unsigned>(static_cast<unsigned char>(byte)));
+    return text.data();
 }
 
 } // namespace
 
-std::string in_utf8(std::string_view text) {
-    return escaped(text, false);
+std::string in_utf8(const std::string& text) {
+    std::string result;
+    for (auto at = text.begin(); at != text.end();) {
+        const auto invalid = utf8::find_invalid(at, text.end());
+        result.append(at, invalid);
+        at = invalid;
+        if (at != text.end()) {
+            result += hexadecimal(*at++);
+        }
+    }
+    return result;
 }
 
-std::string printable(std::string_view text) {
-    return escaped(text, true);
+std::string printable(const std::string& text) {
+    std::string result;
+    const std::string valid = in_utf8(text);
+    for (auto at = valid.begin(); at != valid.end();) {
+        const auto begin = at;
+        const auto code = utf8::unchecked::next(at);
+        if (code < 0x20 || (0x7f <= code && code < 0xa0)) {
+            std::for_each(begin, at, [&](char byte) { result += hexadecimal(byte); });
+        } else {
+            result.append(begin, at);
+        }
+    }
+    return result;
 }
 
 std::string wrapped(const std::string& text, std::size_t indent) {
     constexpr std::size_t columns = 80;
-    std::string result;
-    std::string line;
-    std::istringstream words(text);
+    const std::string margin(indent, ' ');
+    std::string lines;
+    std::string line = margin;
+    std::istringstream words(printable(text));
     for (std::string word; words >> word;) {
-        if (!line.empty() && indent + line.size() + 1 + word.size() > columns) {
-            result += std::string(indent, ' ') + line + "\n";
-            line.clear();
+        if (line.size() > indent && line.size() + 1 + word.size() > columns) {
+            lines += line + "\n";
+            line = margin;
         }
-        line += (line.empty() ? "" : " ") + word;
+        line += (line.size() > indent ? " " : "") + word;
     }
-    return result + std::string(indent, ' ') + line + "\n";
+    return lines + line + "\n";
 }
 
 std::string dataset_name(const std::string& path) {
-    return path.empty()
-               ? "the system's own data"
-               : "update " + path.substr(std::string_view(layout::updates_directory).size());
+    constexpr std::string_view prefix = layout::updates_directory;
+    return path.empty() ? "the system's own data" : "update " + path.substr(prefix.size());
 }
 
 std::string headline(const prediction& start) {
-    const std::string name = start.dataset ? dataset_name(*start.dataset) : "";
     switch (start.decided) {
     case decision::keep:
-        return "keeps " + name;
+        return "keeps " + dataset_name(*start.dataset);
     case decision::adopt:
-        return "adopts " + name;
+        return "adopts " + dataset_name(*start.dataset);
     case decision::drop:
-        return "drops the current update for " + name;
+        return "drops the current update for " + dataset_name(*start.dataset);
     case decision::reset:
-        return "goes back to " + name;
+        return "goes back to " + dataset_name(*start.dataset);
     case decision::fail:
         break;
     }

@@ -4,6 +4,7 @@
 #include <algorithm>
 #include <array>
 #include <cerrno>
+#include <csignal>
 #include <fstream>
 #include <set>
 #include <string_view>
@@ -22,11 +23,7 @@ namespace {
 
 namespace files = std::filesystem;
 
-constexpr std::array ending_signals{SIGHUP, SIGINT, SIGTERM};
-
-std::system_error failure(const std::string& what) {
-    return {errno, std::generic_category(), what};
-}
+volatile std::sig_atomic_t asked_to_end = 0;
 
 // Whether `path` is `directory` or lies below it.
 bool is_within(const files::path& path, const files::path& directory) {
@@ -34,17 +31,15 @@ bool is_within(const files::path& path, const files::path& directory) {
            directory.end();
 }
 
-// Where the links of the state directory lead, as far as that exists.
-std::vector<files::path> led_to() {
-    std::vector<files::path> places;
-    for (const auto* link :
-         {layout::zoneinfo_link, layout::icu_link, layout::latest_link, layout::localtime_link}) {
-        if (const auto target = target_of(link)) {
-            places.push_back(
-                files::weakly_canonical(layout::state_directory / files::path(*target)));
-        }
-    }
-    return places;
+// Whether a link of the state directory leads into `directory`, as it stands or by further links.
+bool is_in_use(const files::path& directory) {
+    constexpr std::array links{layout::zoneinfo_link, layout::icu_link, layout::latest_link,
+                               layout::localtime_link};
+    return std::any_of(links.begin(), links.end(), [&](const char* link) {
+        const auto target = layout::state_directory / files::path(target_of(link).value_or(""));
+        return is_within(target.lexically_normal(), directory) ||
+               is_within(files::weakly_canonical(target), files::canonical(directory));
+    });
 }
 
 bool is_zone_file(const files::directory_entry& entry) {
@@ -74,6 +69,7 @@ std::vector<files::path> installed() {
             found.push_back(entry.path());
         }
     }
+    std::sort(found.begin(), found.end());
     return found;
 }
 
@@ -88,13 +84,9 @@ std::vector<files::path> removable() {
     if (files::is_symlink(files::path(layout::updates_directory).parent_path())) {
         throw refusal("the directory of updates is a link, through which nothing is deleted");
     }
-    const auto in_use = led_to();
     auto found = installed();
-    std::erase_if(found, [&](const auto& directory) {
-        const auto holds = [&](const auto& place) {
-            return is_within(place, files::canonical(directory));
-        };
-        return files::is_symlink(directory) || std::any_of(in_use.begin(), in_use.end(), holds);
+    std::erase_if(found, [](const auto& directory) {
+        return files::is_symlink(directory) || is_in_use(directory);
     });
     return found;
 }
@@ -139,34 +131,19 @@ std::uintmax_t remove_update(const files::path& directory) {
 }
 
 work::work() : lock_(::open(layout::state_directory, O_RDONLY | O_DIRECTORY | O_CLOEXEC)) {
-    if (!lock_.is_open()) {
-        throw failure(layout::state_directory);
+    for (const int signal : {SIGHUP, SIGINT, SIGTERM}) {
+        (void)std::signal(signal, [](int) { asked_to_end = 1; });
     }
-    if (::flock(lock_.number(), LOCK_EX | LOCK_NB) == -1) {
-        if (errno == EWOULDBLOCK) {
-            throw refusal("another tzctl is at work");
-        }
-        throw failure(layout::state_directory);
+    if (!lock_.is_open() || ::flock(lock_.number(), LOCK_EX | LOCK_NB) == -1) {
+        throw std::system_error(errno, std::generic_category(),
+                                errno == EWOULDBLOCK ? "another tzctl is at work"
+                                                     : layout::state_directory);
     }
-    sigset_t signals;
-    ::sigemptyset(&signals);
-    for (const int signal : ending_signals) {
-        ::sigaddset(&signals, signal);
-    }
-    ::sigprocmask(SIG_BLOCK, &signals, &before_);
-}
-
-work::~work() {
-    ::sigprocmask(SIG_SETMASK, &before_, nullptr);
 }
 
 void work::go_on() const {
-    sigset_t pending;
-    ::sigpending(&pending);
-    for (const int signal : ending_signals) {
-        if (::sigismember(&pending, signal) == 1) {
-            throw refusal("interrupted");
-        }
+    if (asked_to_end != 0) {
+        throw refusal("interrupted");
     }
 }
 

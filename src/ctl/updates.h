@@ -6,8 +6,6 @@
 #include <string>
 #include <vector>
 
-#include <csignal>
-
 #include "fs/descriptor.h"
 
 /// What the updater's verbs do to the disk, in earnest. Failures are thrown as std::exception,
@@ -26,7 +24,7 @@ struct refusal : std::runtime_error {
 /// The directory of the update of this version; the path of the system's own data is empty.
 [[nodiscard]] std::string path_of(const std::string& version);
 
-/// The directories of the installed updates, also where that is a link to a directory.
+/// The directories of the installed updates in the order of their names; a link to one counts, too.
 [[nodiscard]] std::vector<std::filesystem::path> installed();
 
 /// The installed updates into which no link of the state directory leads, and that are directories
@@ -46,21 +44,17 @@ std::uintmax_t remove_update(const std::filesystem::path& directory);
 /// How many bytes the files in `directory` and below take.
 [[nodiscard]] std::uintmax_t size_of(const std::filesystem::path& directory);
 
-/// As long as this lives, no other tzctl changes anything, and neither an interruption from the
-/// keyboard nor a request to terminate ends this one before it has put things in order.
+/// As long as this lives, no other tzctl changes anything, and no interruption ends this one before
+/// it has put things in order.
 class work {
   public:
     work();
-    work(const work&) = delete;
-    work& operator=(const work&) = delete;
-    ~work();
 
-    /// Throws if somebody wants this to end.
+    /// Throws a refusal if there was an interruption.
     void go_on() const;
 
   private:
     fs::descriptor lock_;
-    sigset_t before_{};
 };
 
 } // namespace tz::updates

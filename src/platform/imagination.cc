@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: BSD-2-Clause
-#include "ctl/imagination.h"
+#include "platform/imagination.h"
 
 #include <algorithm>
 #include <array>

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: BSD-2-Clause
-#include "ctl/root.h"
+#include "platform/root.h"
 
 #include <cerrno>
 #include <fstream>
