@@ -67,7 +67,9 @@ void declare(CLI::App& app, command_line& given) {
         ->required();
     app.add_subcommand("cleanup", "Delete the updates that are not in use")
         ->add_flag("--dry-run", given.rehearsed, "Only say what would be deleted");
-    app.add_subcommand("make", "Make a dataset: see make-dataset(8)")->prefix_command();
+    app.add_subcommand("make", "Make a dataset: see make-dataset(8)")
+        ->prefix_command()
+        ->fallthrough(false);
 }
 
 void run(const CLI::App& app, const command_line& given) {
