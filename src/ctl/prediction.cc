@@ -145,6 +145,9 @@ prediction predict_start() {
     result.localtime = after[2];
     result.changes = before != after;
     result.warnings = said;
+    if (failed) {
+        result.warnings.emplace_back(messages::gave_up);
+    }
     return result;
 }
 

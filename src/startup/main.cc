@@ -9,7 +9,7 @@ int main() {
         tz::start_up();
         return 0;
     } catch (...) {
-        tz::warn("Could not set all time-zone links");
+        tz::warn(tz::messages::gave_up);
         return 1;
     }
 }

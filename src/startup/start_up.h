@@ -3,11 +3,12 @@
 
 namespace tz {
 
-/// The warning lines that tell why a start goes back to the system's own data.
+/// The warning lines that tell why a start goes back to the system's own data, or fails even so.
 namespace messages {
 inline constexpr char invalid_links[] = "Invalid current symlinks; resetting to system partition";
 inline constexpr char dropped[] = "Symlink points at data incompatible with installed system";
 inline constexpr char fell_back[] = "Unable to locate data; resetting to system partition";
+inline constexpr char gave_up[] = "Could not set all time-zone links"; // said by main
 } // namespace messages
 
 /// One start: decides which time-zone data is current and makes the links say so. Every failure on
