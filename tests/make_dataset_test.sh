@@ -1,42 +1,92 @@
 #!/bin/sh
 # SPDX-License-Identifier: BSD-2-Clause
-# Has make-dataset refuse all that it must, and make a dataset of each kind under hostile modes.
+# Has make-dataset refuse all that it must, and make datasets from all that it takes, under hostile
+# modes. The ICU data is real: that of this machine's ICU library.
 set -eu
-tool=$(cd "$(dirname "$0")/.." && pwd)/tools/make-dataset
+PATH=$PATH:/usr/sbin:/sbin # where icupkg is, for an ordinary user
+project=$(cd "$(dirname "$0")/.." && pwd)
+tool=$project/tools/make-dataset
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
 cd "$work"
 make() { "$tool" "$@"; }
 fail() { echo "$*" >&2 && exit 1; }
 
-mkdir -p one none two misnamed out dying deb/usr/share/zoneinfo
-touch one/icutz44l.dat one/notes two/icutz44l.dat two/icutz44b.dat misnamed/icutz44x.dat
+export TMPDIR="$work/tmp"
+mkdir -p tmp none two misnamed out dying deb/usr/share/zoneinfo table/zone.tab
+touch two/icutz44l.dat two/icutz44b.dat misnamed/icutz44x.dat
 for release in 2016b 2016B 2147483648b; do echo "# version $release" >$release; done
 (cat 2016b && echo Z A/B nonsense) >nonsense
-(cat 2016b && echo Z A/B 0 - UTC) >deb/usr/share/zoneinfo/tzdata.zi
+(cat 2016b && echo Z A/B 0 - UTC) | tee deb/usr/share/zoneinfo/tzdata.zi table/tzdata.zi >/dev/null
+echo AB >deb/usr/share/zoneinfo/zone.tab
+(echo '# version 9999a' && echo Z A/B 0 - UTC) >9999a.zi
 # shellcheck disable=SC2016 # expanded by what is written
 printf '#!/bin/sh\nmkdir "$4"; kill $PPID; echo dying' >dying/zic && chmod +x dying/zic
-sed 's/ zic / no-zic /' "$tool" >without-zic
+for command in zic icupkg; do sed "s/ $command / no-$command /" "$tool" >without-$command; done
 ln -s nowhere out/2016b.9
+
+# ICU's data in every form.
+"$project/demo/icu-data" .
+mv 44l one
+touch one/notes
+echo metaZones.res timezoneTypes.res windowsZones.res zoneinfo64.res >items.txt
+for letter in l b e; do
+    icupkg --auto_toc_prefix -t$letter one/icutz44l.dat icutz44$letter.dat
+    mkdir -p 44/${letter}e
+    icupkg --auto_toc_prefix -d 44/${letter}e -x items.txt icutz44$letter.dat
+done
+mkdir 9 && cp -R 44/ee 9
+echo 'fr:table { key { "depends on a root.res that is not there" } }' >fr.txt
+genrb --quiet fr.txt
+icupkg --ignore-deps --toc_prefix icudt99l -a fr.res icutz44l.dat icudtl.dat 2>/dev/null
+
+# And broken.
+for number in 1 2 3 4 5 6 7; do mkdir $number && cp -R 44/le $number/le; done
+mv 1/le 1/named
+rm 2/le/metaZones.res
+touch 3/le/root.res
+cp 44/be/timezoneTypes.res 4/le
+echo text >5/le/windowsZones.res
+head -c 9999 44/le/zoneinfo64.res >6/le/zoneinfo64.res
+cp 44/le/metaZones.res 7/le/zoneinfo64.res
+mkdir 8 && cp -R 44/ee 8/be
+cp icutz44b.dat icutz45l.dat
+echo text >icudt1l.dat
+icupkg --auto_toc_prefix -r zoneinfo64.res icutz44l.dat icutz46l.dat
 
 while IFS='|' read -r command message; do
     if (eval "$command") >said 2>&1; then fail "not refused: $command"; fi
     grep -qF "$message" said || fail "$command: $(cat said)"
-    [ "$(ls -A out)" = 2016b.9 ] || fail "$command: left $(ls -A out)"
+    left=$(find out tmp -mindepth 1)
+    [ "$left" = out/2016b.9 ] || fail "$command: left $left"
 done <<'END'
 make update deb one|usage: make-dataset update|system TZDATA ICU DIRECTORY
 make upgrade deb one out/2016b.1|usage: make-dataset update|system TZDATA ICU DIRECTORY
 make update one one out/2016b|one/usr/share/zoneinfo/tzdata.zi: not a file that can be read
 make system 2016B one out/share|2016B: its first line is not of the form '# version 2016a'
 make system 2147483648b one out/share|2147483648b: holds a number beyond 2147483647
+make system table/tzdata.zi one out/share|table/zone.tab: not a file that can be read
 make update deb one out/2016b.1.99999999999999999999|.99999999999999999999: holds a number beyond
 make update deb one out/2016b.1.|2016b.1.: not a version such as 2016a.1.0
 make update deb one out/2016bb.1|2016bb.1: not a version of release 2016b, such as 2016b.1.0
 make update deb one out/2016b.9/|out/2016b.9: exists already
+make system deb nowhere out/share|nowhere: not a file that can be read
 make system deb none out/share|none: holds no ICU data file
 make system deb two out/share|two: holds more than one ICU data file
 make system deb misnamed out/share|misnamed/icutz44x.dat: not named like icutz44l.dat
+make system deb 1/named out/share|1/named: not named like icutz44l.dat, icudt72l.dat or 44/le
+make system deb 2/le out/share|2/le: holds no metaZones.res
+make system deb 3/le out/share|3/le/root.res: not one of
+make system deb 4/le out/share|4/le: its timezoneTypes.res is not of schema 4l
+make system deb 5/le out/share|5/le: its windowsZones.res is not ICU data
+make system deb 6/le out/share|6/le: icupkg cannot pack it
+make system deb 7/le out/share|7/le: its zoneinfo64.res names no release
+make system deb 8/be out/share|8/be: its zoneinfo64.res is not of schema 8b
+make system deb icutz45l.dat out/share|icutz45l.dat: its zoneinfo64.res is not of schema 45l
+make system deb icutz46l.dat out/share|icutz46l.dat: holds no zoneinfo64.res
+make system deb icudt1l.dat out/share|icudt1l.dat: icupkg cannot unpack it
 sh without-zic update deb one out/2016b|zic: not found
+sh without-icupkg update deb one out/2016b|icupkg: not found
 make update deb one none/none/2016b|none/none: cannot be written to
 make update 2016b one out/2016b|2016b: holds no zone
 make system deb -one out/share|-one: begins with '-' or holds a newline
@@ -44,13 +94,40 @@ make update nonsense one out/2016b|nonsense: zic cannot compile it
 PATH=dying:$PATH make update deb one out/2016b|dying
 END
 
-chmod 700 one/icutz44l.dat
+# Whatever the modes, all that belongs there is there and can be read.
+chmod 700 one/icutz44l.dat 44/le/*.res
 chmod 2700 out
-(umask 777 && make update deb one out/2016b.1.0 && make system deb one out/share)
+(
+    umask 777
+    make update deb one out/2016b.1.0
+    make system deb/usr/share/zoneinfo/tzdata.zi 44/le out/share
+) >said 2>&1
+[ ! -s said ] || fail "said: $(cat said)"
 (cd out && find 2016b.1.0 share -type f -perm 644 -o -type d ! -perm 755 | sort &&
-    cat share/icu/*.txt ./*/zoneinfo*/+VERSION) | xargs -n 3 | diff /dev/fd/3 - 3<<'END'
-2016b.1.0/icutz/icutz44l.dat 2016b.1.0/zoneinfo/+VERSION 2016b.1.0/zoneinfo/A/B
-share/icu/icutz44l.dat share/icu/icutzformat.txt share/zoneinfo.default/+VERSION
-share/zoneinfo.default/A/B 44l 2016b
-2016b
+    cat share/icu/*.txt ./*/zoneinfo*/+VERSION ./*/zoneinfo*/zone.tab) | xargs -n 3 | diff /dev/fd/3 - 3<<'END'
+2016b.1.0/icutz/icutz44l.dat 2016b.1.0/icutz/metaZones.res 2016b.1.0/icutz/timezoneTypes.res
+2016b.1.0/icutz/windowsZones.res 2016b.1.0/icutz/zoneinfo64.res 2016b.1.0/zoneinfo/+VERSION
+2016b.1.0/zoneinfo/A/B 2016b.1.0/zoneinfo/tzdata.zi 2016b.1.0/zoneinfo/zone.tab
+share/icu/icutz44l.dat share/icu/icutzformat.txt share/icu/metaZones.res
+share/icu/timezoneTypes.res share/icu/windowsZones.res share/icu/zoneinfo64.res
+share/zoneinfo.default/+VERSION share/zoneinfo.default/A/B share/zoneinfo.default/tzdata.zi
+share/zoneinfo.default/zone.tab 44l 2016b
+2016b AB AB
+END
+
+# Every form gives the same items, one by one and packed; and old ones are told of.
+while read -r icu schema reference; do
+    make update 9999a.zi "$icu" out/9999a >said 2>&1
+    grep -q "$icu.*: of release 2[0-9]*[a-z], which is older than 9999a" said || fail "$(cat said)"
+    icupkg --auto_toc_prefix -d tmp -x items.txt "out/9999a/icutz/icutz$schema.dat"
+    rm "out/9999a/icutz/icutz$schema.dat"
+    diff -r tmp "$reference"
+    diff -r out/9999a/icutz "$reference"
+    rm -r tmp/* out/9999a
+done <<'END'
+one 44l 44/le
+icudtl.dat 44l 44/le
+icutz44b.dat 44b 44/be
+44/be 44b 44/be
+9/ee 9e 44/ee
 END
