@@ -81,7 +81,7 @@ ln -sfn /var/db/timezone/tz/2016g/icutz $state/icutz; ctl cleanup|0|2016b|2016d/
 mv $state/tz/2016b root/; ln -s ../../../../2016b $state/tz/2016b; ctl cleanup && cat root/2016b/zoneinfo/Europe/Paris|0|TZif|2016d/zoneinfo 2016d/icutz 2016f 2016b 2016d 2016f
 ln -sfn 2016g $state/tz/2016d; rm -r $state/tz/2016d/2016g; ln -sfn tz/2016d/../2016b $state/tz_latest; ctl cleanup|0|2016e|2016d/zoneinfo 2016d/icutz tz/2016d/../2016b 2016b 2016d
 ln -sfn nowhere $state/zoneinfo; ctl cleanup|1|current link cannot be read
-rm $state/tz_latest; touch $state/tz_latest; ctl cleanup|1|latest link cannot be read
+rm $state/tz_latest; touch $state/tz_latest; ctl cleanup|1|tz_latest cannot be read
 mv $state/tz root/; ln -s /tz $state/tz; ctl cleanup|1|is a link
 exec {lock}<$state; flock $lock; ctl install 2016h|1|another tzctl is at work
 ctl status >/dev/full|1|standard output: No space left

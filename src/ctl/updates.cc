@@ -31,15 +31,31 @@ bool is_within(const files::path& path, const files::path& directory) {
            directory.end();
 }
 
-// Whether a link of the state directory leads into `directory`, as it stands or by further links.
-bool is_in_use(const files::path& directory) {
-    constexpr std::array links{layout::zoneinfo_link, layout::icu_link, layout::latest_link,
-                               layout::localtime_link};
-    return std::any_of(links.begin(), links.end(), [&](const char* link) {
-        const auto target = layout::state_directory / files::path(target_of(link).value_or(""));
-        return is_within(target.lexically_normal(), directory) ||
-               is_within(files::weakly_canonical(target), files::canonical(directory));
-    });
+// Where a link that says `target` leads in the end, as far as that exists.
+files::path final_place(const files::path& target) {
+    std::error_code failure;
+    const auto place = files::weakly_canonical(target, failure);
+    if (failure && failure != std::errc::too_many_symbolic_link_levels) {
+        throw files::filesystem_error("cannot follow a link", target, failure);
+    }
+    return place;
+}
+
+// All that the links of the state directory say, and where they lead in the end. Throws a refusal
+// if that cannot be told.
+std::vector<files::path> places_in_use() {
+    std::vector<files::path> places;
+    for (const char* link :
+         {layout::zoneinfo_link, layout::icu_link, layout::latest_link, layout::localtime_link}) {
+        if (const auto text = target_of(link)) {
+            const auto target = layout::state_directory / files::path(*text);
+            places.push_back(target.lexically_normal());
+            places.push_back(final_place(target));
+        } else if (errno == EINVAL ? link == layout::latest_link : errno != ENOENT) {
+            throw refusal(std::string(link) + " cannot be read, so nothing is known to be unused");
+        }
+    }
+    return places;
 }
 
 bool is_zone_file(const files::directory_entry& entry) {
@@ -77,16 +93,17 @@ std::vector<files::path> removable() {
     if (!current_dataset_path()) {
         throw refusal("the current link cannot be read, so nothing is known to be unused");
     }
-    if (files::exists(files::symlink_status(layout::latest_link)) &&
-        !target_of(layout::latest_link)) {
-        throw refusal("the latest link cannot be read, so nothing is known to be unused");
-    }
     if (files::is_symlink(files::path(layout::updates_directory).parent_path())) {
         throw refusal("the directory of updates is a link, through which nothing is deleted");
     }
     auto found = installed();
-    std::erase_if(found, [](const auto& directory) {
-        return files::is_symlink(directory) || is_in_use(directory);
+    const auto in_use = places_in_use();
+    std::erase_if(found, [&](const auto& directory) {
+        return files::is_symlink(directory) ||
+               std::any_of(in_use.begin(), in_use.end(), [&](const auto& place) {
+                   return is_within(place, directory) ||
+                          is_within(place, files::canonical(directory));
+               });
     });
     return found;
 }
