@@ -1,19 +1,22 @@
 #!/usr/bin/env bash
 # SPDX-License-Identifier: BSD-2-Clause
-# usage: faults.sh PROGRAM "START..." DISTURBANCE...
+# usage: faults.sh BUILD-DIRECTORY "START..." DISTURBANCE...
 # Disturbs every system call of each START in turn, as strace's option "inject" says it: the call
-# fails, or the program is killed on its way in. The root holds only the static PROGRAM and data.
+# fails, or the program is killed on its way in. The verbs "install" and "cleanup" of tzctl are
+# disturbed like a start. The root holds only the static programs and data.
 set -euo pipefail
 PATH=$PATH:/usr/sbin:/sbin # where chroot is, for an ordinary user
 [ "$(id -u)" -eq 0 ] || exec unshare --map-root-user "$0" "$@"
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
 mkdir "$work/root"
-cp "$1" "$work/root/program"
+cp "$1"/tzreconcile "$1"/tzctl "$work/root"
 cd "$work"
 disturbances=("${3?}" "${@:4}")
 
 declare -A starts=( # the links that each finds
+    [install]="zoneinfo=@2016d/zoneinfo icutz=@2016d/icutz tz_latest=@2016e"
+    [cleanup]="zoneinfo=@2016d/zoneinfo icutz=@2016d/icutz tz_latest=@2016e"
     [adopt]="zoneinfo=@2016d/zoneinfo icutz=@2016d/icutz tz_latest=@2016e"
     [drop_and_adopt]="zoneinfo=@2016a/zoneinfo icutz=@2016a/icutz tz_latest=@2016d"
     [first]="tz_latest=@2016d"
@@ -33,7 +36,7 @@ put_back() {
 run() { # OPTION-OF-STRACE COMMAND...
     put_back
     status=0
-    { strace -o calls -e "$1" chroot root "${@:2}" 2>said || status=$?; } 2>killed
+    { strace -o calls -e "$1" chroot root "${@:2}" >/dev/null 2>said || status=$?; } 2>killed
 }
 
 disturb_every_call() { # CHECK-OF-WHAT-IS-LEFT COMMAND...
@@ -68,13 +71,46 @@ survived() {
     *) [ "$status" -eq 137 ] ;;
     esac &&
         { usable root/var || ! usable given || tail -n 2 calls | grep -q '^symlink.*/zoneinfo"'; } &&
-        chroot root /program 2>said && usable root/var
+        chroot root /tzreconcile 2>said && usable root/var
+}
+
+disturb_start() {
+    disturb_every_call survived /tzreconcile
+
+    run trace=none /tzreconcile
+    rm -rf after && mv root/var after
+    put_back # Nobody reads the warnings, files must stay empty, few may be open.
+    { (ulimit -f 0 -n 5 && sleep 0.1 && exec chroot root /tzreconcile) <&- 2>&1 >&- 3>&- 4>&- | : &&
+        diff -r --no-dereference -x TZVersionDiffRecord after root/var; } || fail "hampered"
+}
+
+# All or nothing: the links are as before or as after, the data that they name is there, and every
+# update is whole. Only a death may leave what the next one deletes.
+done_or_not() {
+    local var=root/var/db/timezone update expected
+    [ "$status" -ne 137 ] || rm -rf $var/tz/.tzctl $var/tz_latest.tzctl
+    for update in "$var"/tz/*; do diff -r "$update" "whole/${update##*/}" || return; done
+    for expected in given after; do
+        ! diff -r --no-dereference $expected root/var | grep -qv '/tz: 2016[af]$' && break
+    done && usable root/var && [ -e "root$(readlink $var/tz_latest)/zoneinfo" ]
+}
+
+disturb_tzctl() { # VERB...
+    run trace=none /tzctl "$@"
+    rm -rf after && cp -a root/var after
+    disturb_every_call done_or_not /tzctl "$@"
 }
 
 mkdir -p root/usr/share/{icu,zoneinfo.default} var/db/timezone/tz/2016{a,d,e}/{icutz,zoneinfo}
 echo 44l >root/usr/share/icu/icutzformat.txt
 echo 2016c >root/usr/share/zoneinfo.default/+VERSION
-touch var/db/timezone/tz/2016{a,d,e}/{icutz/icutz44l.dat,zoneinfo/+VERSION}
+for update in 2016a 2016d 2016e; do
+    touch var/db/timezone/tz/$update/{icutz/icutz44l.dat,zoneinfo/+VERSION}
+    echo TZif >var/db/timezone/tz/$update/zoneinfo/UTC
+done
+cp -a var/db/timezone/tz whole
+cp -a whole/2016e whole/2016f
+cp -a whole/2016f root
 for start in $2; do
     rm -rf given
     cp -a var given
@@ -82,11 +118,9 @@ for start in $2; do
         target=${link#*=}
         ln -s "${target/@//var/db/timezone/tz/}" "given/db/timezone/${link%%=*}"
     done
-    disturb_every_call survived /program
-
-    run trace=none /program
-    rm -rf after && mv root/var after
-    put_back # Nobody reads the warnings, files must stay empty, few may be open.
-    { (ulimit -f 0 -n 5 && sleep 0.1 && exec chroot root /program) <&- 2>&1 >&- 3>&- 4>&- | : &&
-        diff -r --no-dereference -x TZVersionDiffRecord after root/var; } || fail "hampered"
+    case $start in
+    install) disturb_tzctl install /2016f ;;
+    cleanup) disturb_tzctl cleanup ;;
+    *) disturb_start ;;
+    esac
 done

@@ -3,7 +3,7 @@
 # Asks tzctl, in the build directory named as the argument, for all that it can do, and for much that
 # it must refuse, in a root directory laid out anew for each row.
 set -eu
-tzctl=$1/tzctl
+tzctl=$(realpath "$1")/tzctl
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
 cd "$work"
