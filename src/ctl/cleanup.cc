@@ -16,7 +16,7 @@ void clean_up(bool rehearsed) {
     }
     std::uintmax_t freed = 0;
     for (const auto& directory : removable) {
-        work.go_on();
+        updates::end_if_interrupted();
         const auto bytes =
             rehearsed ? updates::size_of(directory) : updates::remove_update(directory);
         std::cout << (rehearsed ? "Would delete update " : "Deleted update ")

@@ -57,12 +57,12 @@ void settle(const files::directory_entry& entry) {
     }
 }
 
-void stage(const files::path& source, const updates::work& work) {
+void stage(const files::path& source) {
     const auto staged = updates::staging_directory();
     files::copy(source, staged,
                 files::copy_options::recursive | files::copy_options::copy_symlinks);
     for (const auto& entry : files::recursive_directory_iterator(staged)) {
-        work.go_on();
+        updates::end_if_interrupted();
         settle(entry);
     }
     settle(files::directory_entry(staged));
@@ -108,14 +108,14 @@ void install(const files::path& source, const std::string& version, bool forced)
     const updates::work work;
     check_name(version, forced);
     const staging guard;
-    stage(source, work);
+    stage(source);
 
     const std::string place = updates::path_of(version);
     const auto start = predict_with_staged(place);
     if (!forced) {
         check_adoption(start, place);
     }
-    work.go_on();
+    updates::end_if_interrupted();
     publish(place);
     std::cout << "Installed update " << printable(version) << ". The next start "
               << printable(headline(start)) << ".\n"

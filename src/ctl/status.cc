@@ -59,6 +59,10 @@ std::vector<std::string> removable_paths() {
     }
 }
 
+bool is_system(const ordered_json& dataset) {
+    return dataset["path"].get_ref<const std::string&>().empty();
+}
+
 std::string role_of(const ordered_json& dataset, const ordered_json& survey) {
     static const auto removable = removable_paths();
     const auto& path = dataset["path"];
@@ -69,7 +73,7 @@ std::string role_of(const ordered_json& dataset, const ordered_json& survey) {
     const auto add = [&role](bool holds, const char* word) {
         role += holds ? (role.empty() ? "" : ", ") + std::string(word) : "";
     };
-    add(path == "", "system's own");
+    add(is_system(dataset), "system's own");
     add(is_named("current"), "current");
     add(is_named("latest"), "latest");
     add(std::find(removable.begin(), removable.end(), path) != removable.end(), "may be removed");
@@ -78,7 +82,7 @@ std::string role_of(const ordered_json& dataset, const ordered_json& survey) {
 
 void print_dataset(const ordered_json& dataset, const ordered_json& survey) {
     const auto yes_or_no = [&](const char* key) {
-        return dataset["path"] == "" ? "" : dataset[key] ? "yes" : "no";
+        return is_system(dataset) ? "" : dataset[key] ? "yes" : "no";
     };
     std::cout << std::left << "  " << std::setw(15) << text_of(dataset["version"]) << ' '
               << std::setw(8) << text_of(dataset["release"]) << ' ' << std::setw(7)

@@ -34,7 +34,7 @@ bool is_within(const files::path& path, const files::path& directory) {
 // Where a link that says `target` leads in the end, as far as that exists.
 files::path final_place(const files::path& target) {
     std::error_code failure;
-    const auto place = files::weakly_canonical(target, failure);
+    auto place = files::weakly_canonical(target, failure);
     if (failure && failure != std::errc::too_many_symbolic_link_levels) {
         throw files::filesystem_error("cannot follow a link", target, failure);
     }
@@ -158,7 +158,7 @@ work::work() : lock_(::open(layout::state_directory, O_RDONLY | O_DIRECTORY | O_
     }
 }
 
-void work::go_on() const {
+void end_if_interrupted() {
     if (asked_to_end != 0) {
         throw refusal("interrupted");
     }

@@ -50,11 +50,11 @@ class work {
   public:
     work();
 
-    /// Throws a refusal if there was an interruption.
-    void go_on() const;
-
   private:
     fs::descriptor lock_;
 };
+
+/// Throws a refusal if there was an interruption during the work.
+void end_if_interrupted();
 
 } // namespace tz::updates

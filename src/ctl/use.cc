@@ -24,7 +24,7 @@ using updates::refusal;
 // The path of a dataset that is there, and that others can read.
 std::string checked_path(const std::string& version) {
     const bool system = version == "system";
-    const std::string path = system ? "" : updates::path_of(version);
+    std::string path = system ? "" : updates::path_of(version);
     if (!system && (files::path(version).filename() != version || !files::is_directory(path))) {
         throw refusal(version + " is not installed");
     }

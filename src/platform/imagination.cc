@@ -78,6 +78,15 @@ std::optional<place> look_at(const std::string& path) {
     return place{path, kind::link, {target.data(), static_cast<std::size_t>(length)}};
 }
 
+// From a directory to what its entry `name` is; nothing, with errno set, if that cannot be told.
+std::optional<place> step(const place& at, const std::string& name) {
+    if (name.empty() || name == ".") {
+        return at;
+    }
+    return name == ".." ? place{parent_of(at.path), kind::directory}
+                        : look_at(at.path + "/" + name);
+}
+
 // The place that an absolute path leads to, element by element, as the kernel goes: the last
 // element may be absent, and if it is a link, that is followed or not. Nothing, with errno set, if
 // the path leads nowhere.
@@ -90,14 +99,7 @@ std::optional<place> find(std::string path, bool follow_last) {
         const bool last = slash == std::string::npos;
         const std::string name = path.substr(0, slash);
         path.erase(0, last ? slash : slash + 1);
-        if (name.empty() || name == ".") {
-            continue;
-        }
-        if (name == "..") {
-            at.path = parent_of(at.path);
-            continue;
-        }
-        auto next = look_at(at.path + "/" + name);
+        auto next = step(at, name);
         if (!next) {
             return std::nullopt;
         }
@@ -106,7 +108,7 @@ std::optional<place> find(std::string path, bool follow_last) {
                 errno = ELOOP;
                 return std::nullopt;
             }
-            path = next->target + (last ? "" : "/" + path);
+            path.insert(0, next->target + (last ? "" : "/"));
             at.path = path.starts_with('/') ? "" : at.path;
         } else if (last || next->what == kind::directory) {
             at = *std::move(next);
