@@ -93,9 +93,13 @@ void print_dataset(const ordered_json& dataset, const ordered_json& survey) {
 
 void print_link(const std::string& name, const ordered_json& link, const style& in) {
     const std::string state = link["state"];
-    std::cout << "  " << std::setw(10) << name
-              << (state == "ok" ? "" : in.alarming + state + in.plain + " ")
-              << (link["target"].is_null() ? "" : "-> " + text_of(link["target"])) << '\n';
+    std::cout << "  " << std::setw(10) << name;
+    if (link["target"].is_null()) {
+        std::cout << state << '\n';
+    } else {
+        std::cout << "-> " << text_of(link["target"])
+                  << (state == "ok" ? "" : in.alarming + " (dangling)" + in.plain) << '\n';
+    }
 }
 
 void print(const ordered_json& survey, const prediction& next, const style& in) {
