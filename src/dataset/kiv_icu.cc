@@ -27,9 +27,10 @@ bool is_world_readable_file(const FTSENT& entry) {
 
 // The schema of the first data file that `directory` itself lists; empty if it lists none.
 std::string first_schema_in(std::string directory) {
+    // On 32-bit machines glibc's walk cannot change into a directory that is dated after 2038.
+    constexpr int options = FTS_COMFOLLOW | FTS_PHYSICAL | FTS_XDEV | FTS_NOCHDIR;
     std::array<char*, 2> roots{directory.data(), nullptr};
-    const std::unique_ptr<FTS, walk_closer> walk(
-        platform::fts_open(roots.data(), FTS_COMFOLLOW | FTS_PHYSICAL | FTS_XDEV));
+    const std::unique_ptr<FTS, walk_closer> walk(platform::fts_open(roots.data(), options));
     if (!walk) {
         warn("tz_icu::initialize: fts_open of %s failed, %s", directory.c_str(),
              std::strerror(errno));

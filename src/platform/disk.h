@@ -6,6 +6,10 @@
 #include <fts.h>
 #include <sys/types.h>
 
+// Or a start would fail on files beyond 2 GiB, and on any that is written after January 2038.
+static_assert(sizeof(off_t) == 8 && sizeof(ino_t) == 8 && sizeof(time_t) == 8,
+              "this needs a C library with 64-bit offsets, inode numbers and times");
+
 /// The few calls with which a start looks at the disk and changes it. Each is the call of the C
 /// library that it is named after: arguments, results and `errno` are the same.
 ///
