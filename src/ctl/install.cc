@@ -20,25 +20,13 @@ namespace tz {
 namespace {
 
 namespace files = std::filesystem;
-using updates::refusal;
-
-// Deletes what is half-made.
-struct staging {
-    staging() { files::remove_all(updates::staging_directory()); }
-    staging(const staging&) = delete;
-    staging& operator=(const staging&) = delete;
-    ~staging() {
-        std::error_code none;
-        files::remove_all(updates::staging_directory(), none);
-    }
-};
 
 void check_name(const std::string& version, bool forced) {
     if (version.empty() || version[0] == '.' || !(forced || split_version(version))) {
-        throw refusal("\"" + version + "\" is not a version such as 2016b.1.0");
+        throw std::runtime_error("\"" + version + "\" is not a version such as 2016b.1.0");
     }
     if (files::exists(files::symlink_status(updates::path_of(version)))) {
-        throw refusal(version + " is installed already: see tzctl use");
+        throw std::runtime_error(version + " is installed already: see tzctl use");
     }
 }
 
@@ -81,11 +69,11 @@ prediction predict_with_staged(const std::string& place) {
 
 void check_adoption(const prediction& start, const std::string& place) {
     if (start.decided != decision::adopt || start.dataset != place) {
-        throw refusal("the next start would not adopt it. " + start.reason);
+        throw std::runtime_error("the next start would not adopt it. " + start.reason);
     }
     if (!updates::holds_zones(updates::staging_directory() /
                               files::path(layout::update_zoneinfo).relative_path())) {
-        throw refusal("it holds no tz database, and every time zone would be UTC");
+        throw std::runtime_error("it holds no tz database, and every time zone would be UTC");
     }
 }
 
@@ -107,7 +95,6 @@ void publish(const std::string& place) {
 void install(const files::path& source, const std::string& version, bool forced) {
     const updates::work work;
     check_name(version, forced);
-    const staging guard;
     stage(source);
 
     const std::string place = updates::path_of(version);
@@ -117,9 +104,9 @@ void install(const files::path& source, const std::string& version, bool forced)
     }
     updates::end_if_interrupted();
     publish(place);
-    std::cout << "Installed update " << printable(version) << ". The next start "
-              << printable(headline(start)) << ".\n"
-              << wrapped(printable(start.reason));
+    std::cout << wrapped("Installed update " + version + ". The next start " + headline(start) +
+                         ".")
+              << wrapped(start.reason);
 }
 
 } // namespace tz

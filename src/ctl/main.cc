@@ -1,10 +1,12 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #include <cerrno>
+#include <csignal>
 #include <cstring>
 #include <filesystem>
 #include <iostream>
 #include <string>
 #include <system_error>
+#include <vector>
 
 #include <CLI/CLI.hpp>
 #include <fcntl.h>
@@ -33,6 +35,24 @@ void enter_root_if_any(const std::string& root) {
     if (!root.empty()) {
         tz::enter_root(root);
     }
+}
+
+// Becomes make-dataset, with these arguments.
+[[noreturn]] void make(std::vector<std::string> words) {
+    // Sought from where this program is, as a prefix may be chosen as late as at the installation.
+    const auto here = files::read_symlink("/proc/self/exe").parent_path();
+    std::string program = here / MAKE_DATASET;
+    if (!files::exists(program)) {
+        program = here / "../../tools/make-dataset"; // in a checkout
+    }
+    std::vector<char*> pointers{program.data()};
+    for (auto& word : words) {
+        pointers.push_back(word.data());
+    }
+    pointers.push_back(nullptr);
+    (void)std::signal(SIGPIPE, SIG_DFL); // which is ignored here only
+    ::execv(program.c_str(), pointers.data());
+    throw std::system_error(errno, std::generic_category(), program);
 }
 
 // A dataset is looked for in the image first, and then where the command was given.
@@ -77,7 +97,7 @@ void run(const CLI::App& app, const command_line& given) {
         if (!given.root.empty()) {
             throw CLI::ValidationError("make", "writes where it is told to, and takes no --root");
         }
-        tz::make(app.get_subcommand("make")->remaining());
+        make(app.get_subcommand("make")->remaining());
     }
     if (app.got_subcommand("install")) {
         install(given);

@@ -38,37 +38,27 @@ std::string incompatible(const candidate& one, const candidate& system) {
     return one.name + " has " + schema(one) + ", the system " + schema(system) + ".";
 }
 
-std::string why_kept_or_dropped(const candidate& current, const candidate& system) {
-    if (!current.data.compatible_with(system.data)) {
-        return incompatible(current, system);
-    }
-    const bool kept = keep_current(current.data, system.data);
-    return kept ? current.name + " is current."
-                : system.name + " is newer than " + current.name + ".";
-}
-
-std::string why_not_adopted(const candidate& latest, const candidate& current,
-                            const candidate& system) {
-    if (!latest.data.compatible_with(system.data)) {
-        return incompatible(latest, system);
-    }
-    return latest.data == current.data ? "The latest update is the same."
-                                       : latest.name + " is not newer than " + current.name + ".";
-}
-
 // Why a start in which nothing fails decides as it does.
 std::string why(const std::string& current_path, const std::string& latest_path) {
     const candidate system("");
     const candidate current(current_path);
-    const std::string kept_or_dropped = why_kept_or_dropped(current, system);
+    std::string reason = !current.data.compatible_with(system.data) ? incompatible(current, system)
+                         : keep_current(current.data, system.data)
+                             ? current.name + " is current."
+                             : system.name + " is newer than " + current.name + ".";
     if (latest_path.empty()) {
-        return kept_or_dropped + " No update is offered.";
+        return reason + " No update is offered.";
     }
     const candidate latest(latest_path);
     if (adopt_latest(latest.data, current.data, system.data)) {
         return latest.name + " is compatible and newer than " + current.name + ".";
     }
-    return kept_or_dropped + " " + why_not_adopted(latest, current, system);
+    if (!latest.data.compatible_with(system.data)) {
+        return reason + " " + incompatible(latest, system);
+    }
+    return reason + (latest.data == current.data
+                         ? " The latest update is the same."
+                         : " " + latest.name + " is not newer than " + current.name + ".");
 }
 
 // The line in which `message` was said.

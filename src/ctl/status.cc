@@ -1,53 +1,198 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #include <algorithm>
+#include <array>
 #include <cstdlib>
-#include <filesystem>
+#include <fstream>
 #include <iomanip>
 #include <iostream>
+#include <iterator>
 
+#include <nlohmann/json.hpp>
 #include <unistd.h>
 
-#include "ctl/survey.h"
+#include "ctl/prediction.h"
 #include "ctl/text.h"
 #include "ctl/updates.h"
 #include "ctl/verbs.h"
+#include "dataset/kiv_dataset.h"
+#include "dataset/kiv_icu.h"
+#include "dataset/kiv_zoneinfo.h"
 #include "fs/layout.h"
+#include "fs/operations.h"
+#include "platform/imagination.h"
+#include "platform/warn.h"
 
 namespace tz {
 namespace {
 
+namespace files = std::filesystem;
 using nlohmann::ordered_json;
 
-// How a terminal is told to stress something; nothing where colour is not wanted.
-struct style {
-    std::string strong;
-    std::string alarming;
-    std::string plain;
-};
+ordered_json text_or_null(const std::optional<std::string>& text) {
+    return text ? ordered_json(in_utf8(*text)) : ordered_json();
+}
 
-style style_of_output() {
-    const char* const refused = std::getenv("NO_COLOR"); // see no-color.org
-    const bool wanted = refused == nullptr || *refused == '\0';
-    return wanted && ::isatty(STDOUT_FILENO) == 1 ? style{"\x1b[1m", "\x1b[33m", "\x1b[0m"}
-                                                  : style{};
+ordered_json word_or_null(const std::string& word) {
+    return word.empty() ? ordered_json() : ordered_json(in_utf8(word));
+}
+
+// A dataset, also one whose version a start cannot read; null if the path names none.
+ordered_json describe(const std::string& path, const kiv_dataset* system) {
+    std::string version = files::path(path).filename();
+    bool newer = false;
+    try {
+        const kiv_dataset dataset(path);
+        version = dataset.version_string();
+        newer = system != nullptr && dataset > *system;
+    } catch (const std::out_of_range&) {
+        warn("%s: the version holds a number beyond 2147483647", version.c_str());
+    } catch (...) {
+        return nullptr;
+    }
+    const kiv_icu icu(path);
+    return {{"path", in_utf8(path)},
+            {"version", in_utf8(version)},
+            {"release", word_or_null(kiv_zoneinfo(path).version())},
+            {"schema", word_or_null(icu.schema())},
+            {"compatible", icu.compatible_schema(kiv_icu())},
+            {"newer_than_system", newer}};
+}
+
+data_version version_of(const ordered_json& dataset) {
+    try {
+        return data_version(dataset["version"]);
+    } catch (const std::out_of_range&) {
+        return {}; // as old as those of no known form
+    }
+}
+
+bool is_newer(const ordered_json& left, const ordered_json& right) {
+    const auto mine = version_of(left);
+    const auto theirs = version_of(right);
+    return mine == theirs ? left["version"] < right["version"] : mine > theirs;
+}
+
+ordered_json describe_installed(const kiv_dataset* system) {
+    ordered_json datasets = ordered_json::array();
+    for (const auto& directory : updates::installed()) {
+        datasets.push_back(describe(directory, system));
+    }
+    std::sort(datasets.begin(), datasets.end(), is_newer);
+    return datasets;
+}
+
+ordered_json describe_link(const char* path) {
+    const auto target = target_of(path);
+    std::error_code none;
+    const bool missing = !files::exists(files::symlink_status(path, none));
+    const char* const state = missing             ? "missing"
+                              : !target           ? "not a link"
+                              : !fs::exists(path) ? "dangling"
+                                                  : "ok";
+    return {{"path", path}, {"target", text_or_null(target)}, {"state", state}};
+}
+
+ordered_json describe_start(const prediction& start) {
+    constexpr std::array decisions{"keep", "adopt", "drop", "reset", "fail"};
+    const bool fails = start.decided == decision::fail;
+    return {{"decision", decisions.at(static_cast<std::size_t>(start.decided))},
+            {"dataset", text_or_null(fails ? std::nullopt : start.dataset)},
+            {"icutz", text_or_null(start.icutz)},
+            {"localtime", text_or_null(start.localtime)},
+            {"changes", start.changes},
+            {"reason", in_utf8(start.reason)}};
+}
+
+ordered_json text_in(const char* path) {
+    std::error_code none;
+    if (!files::is_regular_file(path, none)) {
+        return nullptr;
+    }
+    std::ifstream file(path);
+    return in_utf8(std::string(std::istreambuf_iterator(file), {}));
+}
+
+// The lines said while datasets were looked at, some of them twice; and what no start says.
+ordered_json findings(const ordered_json& found, const std::optional<std::string>& current) {
+    ordered_json all = ordered_json::array();
+    const auto add = [&all](bool holds, const std::string& finding) {
+        if (holds && std::find(all.begin(), all.end(), in_utf8(finding)) == all.end()) {
+            all.push_back(in_utf8(finding));
+        }
+    };
+    for (const auto& line : imagination::take_warnings()) {
+        add(true, line);
+    }
+    const auto& links = found["links"];
+    const bool update = current && !current->empty();
+    add(!updates::holds_zones(layout::system_zoneinfo),
+        std::string("There is no zone file in ") + layout::system_zoneinfo + ".");
+    add(update && !updates::holds_zones(*current + layout::update_zoneinfo),
+        "The current update holds no zone file: every time zone is UTC.");
+    add(update && target_of(layout::icu_link) != *current + layout::update_icu,
+        "The ICU link does not lead into the current update: tzctl use mends that.");
+    add(current && !update && links["icutz"]["state"] != "missing",
+        "The ICU link has been left behind, for the system's own data is current: tzctl use system "
+        "mends that.");
+    add(links["tz_latest"]["state"] == "dangling", "The latest link leads nowhere.");
+    add(links["localtime"]["state"] == "dangling",
+        "The local-time link leads to no zone file: local time is UTC.");
+    return all;
+}
+
+// All that is told, as the object that tzctl(8) describes, with every text in UTF-8.
+ordered_json survey(prediction& next_start) {
+    imagination::forget();
+    std::optional<kiv_dataset> system;
+    try {
+        system.emplace();
+    } catch (...) {
+        warn("No start can use the system's own data");
+    }
+    const kiv_dataset* const reference = system ? &*system : nullptr;
+    const auto current = current_dataset_path();
+    const auto latest = target_of(layout::latest_link);
+    ordered_json found{{"format", 1},
+                       {"system", system ? describe("", reference) : nullptr},
+                       {"current", current ? describe(*current, reference) : nullptr},
+                       {"latest", latest ? describe(*latest, reference) : nullptr},
+                       {"installed", describe_installed(reference)},
+                       {"links",
+                        {{"zoneinfo", describe_link(layout::zoneinfo_link)},
+                         {"icutz", describe_link(layout::icu_link)},
+                         {"tz_latest", describe_link(layout::latest_link)},
+                         {"localtime", describe_link(layout::localtime_link)}}},
+                       {"marker", fs::exists(layout::cleanup_marker)},
+                       {"record", text_in(layout::version_diff_record)},
+                       {"next_start", nullptr},
+                       {"findings", nullptr}};
+    found["findings"] = findings(found, current);
+    next_start = predict_start();
+    found["next_start"] = describe_start(next_start);
+    if (found["links"]["localtime"]["state"] == "ok" && !fs::exists(layout::localtime_link)) {
+        found["findings"].push_back("The next start makes data current that lacks the local zone.");
+    }
+    return found;
+}
+
+// Where colour is wanted, `text` as a terminal is told to stress it. See no-color.org.
+std::string stressed(const std::string& text, const char* how = "\x1b[1m") {
+    static const char* const refused = std::getenv("NO_COLOR");
+    static const bool wanted =
+        (refused == nullptr || *refused == '\0') && ::isatty(STDOUT_FILENO) == 1;
+    return wanted ? how + text + "\x1b[0m" : text;
+}
+
+std::string alarming(const std::string& text) {
+    return stressed(text, "\x1b[33m");
 }
 
 std::string text_of(const ordered_json& text) {
     return text.is_null() ? "none" : printable(text);
 }
 
-void print_title(const style& in, const std::string& title) {
-    std::cout << '\n' << in.strong << title << in.plain << '\n';
-}
-
-void print_lines(const std::vector<std::string>& lines, const std::string& title, const style& in,
-                 const std::string& how) {
-    if (!lines.empty()) {
-        print_title(in, title);
-    }
-    for (const auto& line : lines) {
-        std::cout << how << wrapped(line, 2) << in.plain;
-    }
+void print_title(const std::string& title) {
+    std::cout << '\n' << stressed(title) << '\n';
 }
 
 std::vector<std::string> removable_paths() {
@@ -66,18 +211,13 @@ bool is_system(const ordered_json& dataset) {
 std::string role_of(const ordered_json& dataset, const ordered_json& survey) {
     static const auto removable = removable_paths();
     const auto& path = dataset["path"];
-    const auto is_named = [&](const char* link) {
-        return !survey[link].is_null() && survey[link]["path"] == path;
-    };
-    std::string role;
-    const auto add = [&role](bool holds, const char* word) {
-        role += holds ? (role.empty() ? "" : ", ") + std::string(word) : "";
-    };
-    add(is_system(dataset), "system's own");
-    add(is_named("current"), "current");
-    add(is_named("latest"), "latest");
-    add(std::find(removable.begin(), removable.end(), path) != removable.end(), "may be removed");
-    return role;
+    std::string role = is_system(dataset) ? ", system's own" : "";
+    for (const std::string link : {"current", "latest"}) {
+        role += survey[link].is_object() && survey[link]["path"] == path ? ", " + link : "";
+    }
+    const bool kept = std::find(removable.begin(), removable.end(), path) == removable.end();
+    role += kept ? "" : ", may be removed";
+    return role.substr(std::min<std::size_t>(role.size(), 2));
 }
 
 void print_dataset(const ordered_json& dataset, const ordered_json& survey) {
@@ -91,37 +231,42 @@ void print_dataset(const ordered_json& dataset, const ordered_json& survey) {
               << '\n';
 }
 
-void print_link(const std::string& name, const ordered_json& link, const style& in) {
+void print_link(const std::string& name, const ordered_json& link) {
     const std::string state = link["state"];
     std::cout << "  " << std::setw(10) << name;
     if (link["target"].is_null()) {
         std::cout << state << '\n';
     } else {
         std::cout << "-> " << text_of(link["target"])
-                  << (state == "ok" ? "" : in.alarming + " (dangling)" + in.plain) << '\n';
+                  << (state == "ok" ? "" : alarming(" (dangling)")) << '\n';
     }
 }
 
-void print(const ordered_json& survey, const prediction& next, const style& in) {
-    print_title(in, "The next start " + printable(headline(next)) + ".");
+void print(const ordered_json& survey, const prediction& next) {
+    print_title("The next start " + printable(headline(next)) + ".");
     std::cout << wrapped(next.reason, 2);
-    print_lines(next.warnings, "It will say", in, "");
-
-    print_title(in, "Datasets          release  schema  compatible  newer");
+    for (const auto& line : next.warnings) {
+        std::cout << wrapped("It will say: " + line, 2);
+    }
+    print_title("Datasets          release  schema  compatible  newer");
     for (const auto& dataset : survey["installed"]) {
         print_dataset(dataset, survey);
     }
     if (!survey["system"].is_null()) {
         print_dataset(survey["system"], survey);
     }
-
-    print_title(in, std::string("Links in ") + layout::state_directory);
+    print_title(std::string("Links in ") + layout::state_directory);
     for (const auto& [name, link] : survey["links"].items()) {
-        print_link(name, link, in);
+        print_link(name, link);
     }
     std::cout << "\nThe last adoption: " << text_of(survey["record"]) << '\n'
               << "An update may be removed (marker): " << (survey["marker"] ? "yes" : "no") << '\n';
-    print_lines(survey["findings"], "What is not as it should be", in, in.alarming);
+    if (!survey["findings"].empty()) {
+        print_title("What is not as it should be");
+    }
+    for (const auto& line : survey["findings"]) {
+        std::cout << alarming(wrapped(line, 2));
+    }
     std::cout << '\n';
 }
 
@@ -133,7 +278,7 @@ void print_status(bool as_json) {
     if (as_json) {
         std::cout << found.dump(2) << '\n';
     } else {
-        print(found, next, style_of_output());
+        print(found, next);
     }
 }
 

@@ -1,9 +1,6 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #include "ctl/text.h"
 
-#include <algorithm>
-#include <array>
-#include <cstdio>
 #include <sstream>
 #include <string_view>
 
@@ -14,41 +11,35 @@
 namespace tz {
 namespace {
 
-std::string hexadecimal(char byte) {
-    std::array<char, 5> text{};
-    (void)std::snprintf(text.data(), text.size(), "\\x%02x",
-                        static_cast<unsigned>(static_cast<unsigned char>(byte)));
-    return text.data();
+// `text` with \x and hexadecimal digits for what is not UTF-8, or a code that is not `wanted`.
+std::string escaped(const std::string& text, bool (*wanted)(utf8::uint32_t code)) {
+    constexpr std::string_view digits = "0123456789abcdef";
+    std::string result;
+    for (auto at = text.begin(); at != text.end();) {
+        auto end = at;
+        bool shown = false;
+        try {
+            shown = wanted(utf8::next(end, text.end()));
+        } catch (const utf8::exception&) {
+            end = at + 1;
+        }
+        for (; at != end; ++at) {
+            const auto byte = static_cast<unsigned char>(*at);
+            result += shown ? std::string(1, *at)
+                            : std::string{'\\', 'x', digits[byte / 16], digits[byte % 16]};
+        }
+    }
+    return result;
 }
 
 } // namespace
 
 std::string in_utf8(const std::string& text) {
-    std::string result;
-    for (auto at = text.begin(); at != text.end();) {
-        const auto invalid = utf8::find_invalid(at, text.end());
-        result.append(at, invalid);
-        at = invalid;
-        if (at != text.end()) {
-            result += hexadecimal(*at++);
-        }
-    }
-    return result;
+    return escaped(text, [](auto) { return true; });
 }
 
 std::string printable(const std::string& text) {
-    std::string result;
-    const std::string valid = in_utf8(text);
-    for (auto at = valid.begin(); at != valid.end();) {
-        const auto begin = at;
-        const auto code = utf8::unchecked::next(at);
-        if (code < 0x20 || (0x7f <= code && code < 0xa0)) {
-            std::for_each(begin, at, [&](char byte) { result += hexadecimal(byte); });
-        } else {
-            result.append(begin, at);
-        }
-    }
-    return result;
+    return escaped(text, [](auto code) { return code >= 0x20 && (code < 0x7f || code >= 0xa0); });
 }
 
 std::string wrapped(const std::string& text, std::size_t indent) {
@@ -86,12 +77,6 @@ std::string headline(const prediction& start) {
         break;
     }
     return "fails";
-}
-
-std::string amount(std::uintmax_t bytes) {
-    std::array<char, 32> text{};
-    (void)std::snprintf(text.data(), text.size(), "%.1f MB", static_cast<double>(bytes) / 1e6);
-    return text.data();
 }
 
 } // namespace tz

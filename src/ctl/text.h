@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #pragma once
 
-#include <cstdint>
 #include <string>
 
 #include "ctl/prediction.h"
@@ -23,8 +22,5 @@ namespace tz {
 
 /// What a start does, in a few words, such as "adopts update 2016d.1.0".
 [[nodiscard]] std::string headline(const prediction& start);
-
-/// An amount of bytes, such as "3.4 MB".
-[[nodiscard]] std::string amount(std::uintmax_t bytes);
 
 } // namespace tz

@@ -6,13 +6,11 @@
 #include <cerrno>
 #include <csignal>
 #include <fstream>
-#include <set>
 #include <string_view>
 #include <system_error>
 
 #include <fcntl.h>
 #include <sys/file.h>
-#include <sys/stat.h>
 #include <unistd.h>
 
 #include "ctl/prediction.h"
@@ -52,7 +50,8 @@ std::vector<files::path> places_in_use() {
             places.push_back(target.lexically_normal());
             places.push_back(final_place(target));
         } else if (errno == EINVAL ? link == layout::latest_link : errno != ENOENT) {
-            throw refusal(std::string(link) + " cannot be read, so nothing is known to be unused");
+            throw std::runtime_error(std::string(link) +
+                                     " cannot be read, so nothing is known to be unused");
         }
     }
     return places;
@@ -91,10 +90,12 @@ std::vector<files::path> installed() {
 
 std::vector<files::path> removable() {
     if (!current_dataset_path()) {
-        throw refusal("the current link cannot be read, so nothing is known to be unused");
+        throw std::runtime_error(
+            "the current link cannot be read, so nothing is known to be unused");
     }
     if (files::is_symlink(files::path(layout::updates_directory).parent_path())) {
-        throw refusal("the directory of updates is a link, through which nothing is deleted");
+        throw std::runtime_error(
+            "the directory of updates is a link, through which nothing is deleted");
     }
     auto found = installed();
     const auto in_use = places_in_use();
@@ -127,26 +128,6 @@ void replace_link(const std::string& target, const files::path& path) {
     }
 }
 
-std::uintmax_t size_of(const files::path& directory) {
-    std::uintmax_t bytes = 0;
-    std::set<std::pair<dev_t, ino_t>> counted; // a file may have several names
-    for (const auto& entry : files::recursive_directory_iterator(directory)) {
-        struct stat status {};
-        if (::lstat(entry.path().c_str(), &status) == 0 &&
-            counted.emplace(status.st_dev, status.st_ino).second) {
-            bytes += static_cast<std::uintmax_t>(status.st_blocks) * 512;
-        }
-    }
-    return bytes;
-}
-
-std::uintmax_t remove_update(const files::path& directory) {
-    const auto bytes = size_of(directory);
-    files::rename(directory, staging_directory());
-    files::remove_all(staging_directory());
-    return bytes;
-}
-
 work::work() : lock_(::open(layout::state_directory, O_RDONLY | O_DIRECTORY | O_CLOEXEC)) {
     for (const int signal : {SIGHUP, SIGINT, SIGTERM}) {
         (void)std::signal(signal, [](int) { asked_to_end = 1; });
@@ -156,11 +137,17 @@ work::work() : lock_(::open(layout::state_directory, O_RDONLY | O_DIRECTORY | O_
                                 errno == EWOULDBLOCK ? "another tzctl is at work"
                                                      : layout::state_directory);
     }
+    files::remove_all(staging_directory());
+}
+
+work::~work() {
+    std::error_code none;
+    files::remove_all(staging_directory(), none);
 }
 
 void end_if_interrupted() {
     if (asked_to_end != 0) {
-        throw refusal("interrupted");
+        throw std::runtime_error("interrupted");
     }
 }
 

@@ -2,7 +2,6 @@
 #pragma once
 
 #include <filesystem>
-#include <stdexcept>
 #include <string>
 #include <vector>
 
@@ -12,13 +11,7 @@
 /// whose text is for people.
 namespace tz::updates {
 
-/// What was asked for will not be done.
-struct refusal : std::runtime_error {
-    using std::runtime_error::runtime_error;
-};
-
-/// Where a directory of updates keeps what is half-made or half-deleted. Whoever is at work may
-/// delete it.
+/// Where a directory of updates keeps what is half-made or half-deleted.
 [[nodiscard]] std::filesystem::path staging_directory();
 
 /// The directory of the update of this version; the path of the system's own data is empty.
@@ -28,7 +21,7 @@ struct refusal : std::runtime_error {
 [[nodiscard]] std::vector<std::filesystem::path> installed();
 
 /// The installed updates into which no link of the state directory leads, and that are directories
-/// themselves. Throws a refusal while that cannot be told.
+/// themselves. Throws while that cannot be told.
 [[nodiscard]] std::vector<std::filesystem::path> removable();
 
 /// Whether there is a compiled zone file in `directory` or below.
@@ -37,24 +30,20 @@ struct refusal : std::runtime_error {
 /// Makes the link `path` say `target`, in one step: nobody ever finds no link there.
 void replace_link(const std::string& target, const std::filesystem::path& path);
 
-/// Deletes `directory` and all below it; whoever looks finds all of it or nothing. Returns how many
-/// bytes that gives back.
-std::uintmax_t remove_update(const std::filesystem::path& directory);
-
-/// How many bytes the files in `directory` and below take.
-[[nodiscard]] std::uintmax_t size_of(const std::filesystem::path& directory);
-
 /// As long as this lives, no other tzctl changes anything, and no interruption ends this one before
-/// it has put things in order.
+/// it has put things in order. Nothing half-made is there before or after.
 class work {
   public:
     work();
+    work(const work&) = delete;
+    work& operator=(const work&) = delete;
+    ~work();
 
   private:
     fs::descriptor lock_;
 };
 
-/// Throws a refusal if there was an interruption during the work.
+/// Throws if there was an interruption during the work.
 void end_if_interrupted();
 
 } // namespace tz::updates

@@ -19,17 +19,16 @@ namespace tz {
 namespace {
 
 namespace files = std::filesystem;
-using updates::refusal;
 
 // The path of a dataset that is there, and that others can read.
 std::string checked_path(const std::string& version) {
     const bool system = version == "system";
     std::string path = system ? "" : updates::path_of(version);
     if (!system && (files::path(version).filename() != version || !files::is_directory(path))) {
-        throw refusal(version + " is not installed");
+        throw std::runtime_error(version + " is not installed");
     }
     if (!updates::holds_zones(system ? layout::system_zoneinfo : path + layout::update_zoneinfo)) {
-        throw refusal(dataset_name(path) + " holds no tz database that can be read");
+        throw std::runtime_error(dataset_name(path) + " holds no tz database that can be read");
     }
     return path;
 }
@@ -45,7 +44,7 @@ imagination::changes imagine_use(const std::string& path) {
         }
     } catch (...) {
         const auto said = imagination::take_warnings();
-        throw refusal(said.empty() ? "its version cannot be read" : said.back());
+        throw std::runtime_error(said.empty() ? "its version cannot be read" : said.back());
     }
     return imagination::noted();
 }
@@ -84,7 +83,7 @@ void use(const std::string& version) {
     const std::string path = checked_path(version);
     const auto changes = imagine_use(path);
     if (const auto start = predict_start(); start.dataset != path) {
-        throw refusal("the next start would not keep it. " + start.reason);
+        throw std::runtime_error("the next start would not keep it. " + start.reason);
     }
     carry_out(changes);
     std::cout << "Current now: " << printable(dataset_name(path)) << ".\n"

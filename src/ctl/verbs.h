@@ -3,7 +3,6 @@
 
 #include <filesystem>
 #include <string>
-#include <vector>
 
 /// What tzctl can be asked to do. All print what came of it on standard output, and throw
 /// std::exception, whose text is for people, if it was refused or failed.
@@ -25,8 +24,5 @@ void use(const std::string& version);
 
 /// Deletes the installed updates that are not in use; with `rehearsed`, only says which these are.
 void clean_up(bool rehearsed);
-
-/// Becomes make-dataset, with these arguments.
-[[noreturn]] void make(const std::vector<std::string>& arguments);
 
 } // namespace tz
