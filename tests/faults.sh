@@ -2,8 +2,8 @@
 # SPDX-License-Identifier: BSD-2-Clause
 # usage: faults.sh BUILD-DIRECTORY "START..." DISTURBANCE...
 # Disturbs every system call of each START in turn, as strace's option "inject" says it: the call
-# fails, or the program is killed on its way in. The verbs "install" and "cleanup" of tzctl are
-# disturbed like a start. The root holds only the static programs and data.
+# fails, or the program is killed on its way in. The verbs "install", "use" and "cleanup" of
+# tzctl are disturbed like a start. The root holds only the static programs and data.
 set -euo pipefail
 PATH=$PATH:/usr/sbin:/sbin # where chroot is, for an ordinary user
 [ "$(id -u)" -eq 0 ] || exec unshare --map-root-user "$0" "$@"
@@ -15,6 +15,7 @@ cd "$work"
 disturbances=("${3?}" "${@:4}")
 
 declare -A starts=( # the links that each finds
+    [use]="zoneinfo=@2016d/zoneinfo icutz=@2016d/icutz tz_latest=@2016d"
     [install]="zoneinfo=@2016d/zoneinfo icutz=@2016d/icutz tz_latest=@2016e"
     [cleanup]="zoneinfo=@2016d/zoneinfo icutz=@2016d/icutz tz_latest=@2016e"
     [adopt]="zoneinfo=@2016d/zoneinfo icutz=@2016d/icutz tz_latest=@2016e"
@@ -88,7 +89,7 @@ disturb_start() {
 # update is whole. Only a death may leave what the next one deletes.
 done_or_not() {
     local var=root/var/db/timezone update expected
-    [ "$status" -ne 137 ] || rm -rf $var/tz/.tzctl $var/tz_latest.tzctl
+    [ "$status" -ne 137 ] || rm -rf $var/tz/.tzctl $var/*.tzctl-*
     for update in "$var"/tz/*; do diff -r "$update" "whole/${update##*/}" || return; done
     for expected in given after; do
         ! diff -r --no-dereference $expected root/var | grep -qv '/tz: 2016[af]$' && break
@@ -120,6 +121,7 @@ for start in $2; do
     done
     case $start in
     install) disturb_tzctl install /2016f ;;
+    use) disturb_tzctl use 2016e ;;
     cleanup) disturb_tzctl cleanup ;;
     *) disturb_start ;;
     esac

@@ -63,7 +63,9 @@ rm -r 2016h/zoneinfo; ctl install 2016h|1|holds no tz database
 mv 2016h 2016H; ctl install 2016H|1|"2016H" is not a version
 mv 2016h 20160000000h; ctl install 20160000000h|1|a number beyond 2147483647
 mv 2016h 2016g; ctl install 2016g|1|2016g is installed already
-mkfifo 2016h/zoneinfo/pipe; ctl install 2016h|1|not
+mkfifo 2016h/zoneinfo/pipe; ctl install 2016h|1|pipe is neither a file
+mv $state/tz root/; ln -s /tz $state/tz; ctl install 2016h|1|is a link
+rm -r 2016h/zoneinfo; ctl install --force 2016h|0|holds no tz database|2016d/zoneinfo 2016d/icutz 2016h 2016b 2016d 2016e 2016f 2016g 2016h
 ctl install missing|1|missing: No such file
 rm $state/tz_latest; mkdir $state/tz_latest; ctl install 2016h|1|tz_latest
 ctl use 2016f|0|Current now: update 2016f.|2016f/zoneinfo 2016f/icutz 2016f 2016b 2016d 2016e 2016f 2016g
@@ -71,29 +73,31 @@ ctl use 2016f && told .next_start.decision|0|keep|2016f/zoneinfo 2016f/icutz 201
 ctl use system && told .next_start.decision|0|keep|zoneinfo.default none none 2016b 2016d 2016e 2016f 2016g
 ctl use 2016b|1|2016c.1.0 (the system's own data) is newer than 2016b.
 ctl use 2016e|1|2016e has ICU schema 44b
-ctl use 2016h|1|2016h is not installed
+ctl use 2016h|1|"2016h" is not installed
+ctl use ..|1|is not installed
 ctl use ../tz/2016f|1|is not installed
 rm -r $state/tz/2016f/zoneinfo; ctl use 2016f|1|holds no tz database
 rm $state/icutz; mkdir $state/icutz; ctl use 2016f|1|File exists
 ctl cleanup --dry-run|0|Would delete update 2016b
 ctl cleanup|0|Deleted update 2016g|2016d/zoneinfo 2016d/icutz 2016f 2016d 2016f
-ln -sfn /var/db/timezone/tz/2016g/icutz $state/icutz; ctl cleanup|0|2016b|2016d/zoneinfo 2016g/icutz 2016f 2016d 2016f 2016g
+ln -sfn /var/db/timezone/tz/2016g/../2016d/icutz $state/icutz; ctl cleanup|0|2016b|2016d/zoneinfo 2016g/../2016d/icutz 2016f 2016d 2016f 2016g
 mv $state/tz/2016b root/; ln -s ../../../../2016b $state/tz/2016b; ctl cleanup && cat root/2016b/zoneinfo/Europe/Paris|0|TZif|2016d/zoneinfo 2016d/icutz 2016f 2016b 2016d 2016f
 ln -sfn 2016g $state/tz/2016d; rm -r $state/tz/2016d/2016g; ln -sfn tz/2016d/../2016b $state/tz_latest; ctl cleanup|0|2016e|2016d/zoneinfo 2016d/icutz tz/2016d/../2016b 2016b 2016d
 ln -sfn nowhere $state/zoneinfo; ctl cleanup|1|current link cannot be read
 rm $state/tz_latest; touch $state/tz_latest; ctl cleanup|1|tz_latest cannot be read
 mv $state/tz root/; ln -s /tz $state/tz; ctl cleanup|1|is a link
 exec {lock}<$state; flock $lock; ctl install 2016h|1|another tzctl is at work
-ctl status >/dev/full|1|standard output: No space left
-ctl status >&-|1|standard output: Bad file descriptor
+ctl status >/dev/full|1|standard output
+ctl --version >&-|1|standard output
 plain_and_narrow|0|fits
 told '.installed[0].version + .installed[4].version + .system.version'|0|2016g2016b2016c.1.0
 ln -sfn "$(printf 'a\377b\033')" $state/localtime; told .links.localtime.target|0|a\xffb
 ln -sfn "$(printf 'a\377b\033')" $state/localtime; ctl|0|a\xffb\x1b
 rm $state/icutz; told .findings[]|0|The ICU link does not lead into the current update
-rm $state/tz/2016d/zoneinfo/Europe/Paris; told .findings[]|0|The local-time link leads to no zone file
+ln -sfn /var/db/timezone/zoneinfo/Europe $state/localtime; told .findings[]|0|The local-time link leads to no zone file
 rm $state/tz/2016f/zoneinfo/Europe/Paris; told .findings[]|0|lacks the local zone
 ctl use|2|VERSION
+"$tzctl" --root "" cleanup|2|--root
 ctl frobnicate|2|frobnicate
 ctl make update|2|takes no --root
 END

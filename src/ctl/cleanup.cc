@@ -32,9 +32,9 @@ double size_of(const files::path& directory) {
 }
 
 // Whoever looks finds all of it or nothing.
-void remove_update(const files::path& directory) {
-    files::rename(directory, updates::staging_directory());
-    files::remove_all(updates::staging_directory());
+void remove_update(const files::path& name) {
+    files::rename(name, updates::staging);
+    files::remove_all(updates::staging);
 }
 
 } // namespace
@@ -50,10 +50,10 @@ void clean_up(bool rehearsed) {
         updates::end_if_interrupted();
         const double size = size_of(directory);
         if (!rehearsed) {
-            remove_update(directory);
+            remove_update(directory.filename());
         }
         std::cout << (rehearsed ? "Would delete update " : "Deleted update ")
-                  << printable(directory.filename()) << ": " << size << " MB" << std::endl;
+                  << printable(directory.filename()) << ": " << size << " MB\n";
         freed += size;
     }
     std::cout << (rehearsed ? "That would give back " : "That gives back ") << freed << " MB.\n";

@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #include <cerrno>
 #include <csignal>
-#include <cstring>
 #include <filesystem>
 #include <iostream>
 #include <string>
@@ -13,6 +12,7 @@
 #include <unistd.h>
 
 #include "ctl/text.h"
+#include "ctl/updates.h"
 #include "ctl/verbs.h"
 #include "fs/descriptor.h"
 #include "platform/process.h"
@@ -55,36 +55,44 @@ void enter_root_if_any(const std::string& root) {
     throw std::system_error(errno, std::generic_category(), program);
 }
 
-// A dataset is looked for in the image first, and then where the command was given.
+// A dataset is looked for where the command was given if its path is relative; and otherwise, or if
+// nothing is there, in the image first.
 void install(const command_line& given) {
     std::error_code missing;
     const files::path outside = files::canonical(given.dataset, missing);
-    const tz::fs::descriptor directory(::open(outside.c_str(), O_DIRECTORY | O_CLOEXEC));
+    const tz::fs::descriptor there(::open(outside.c_str(), O_DIRECTORY | O_CLOEXEC));
     enter_root_if_any(given.root);
     const files::path inside = files::canonical(given.dataset, missing);
-    if (!missing) {
-        tz::install(inside, inside.filename(), given.forced);
-    } else if (::fchdir(directory.number()) == 0) { // stays in reach
-        tz::install(".", outside.filename(), given.forced);
+    if (there.is_open() && (missing || files::path(given.dataset).is_relative())) {
+        tz::install(there, outside.filename(), given.forced);
     } else {
-        throw std::system_error(missing, given.dataset);
+        const tz::fs::descriptor here(::open(inside.c_str(), O_DIRECTORY | O_CLOEXEC));
+        tz::updates::check(here.number(), given.dataset);
+        tz::install(here, inside.filename(), given.forced);
     }
 }
 
 void declare(CLI::App& app, command_line& given) {
     app.set_version_flag("--version", "tzctl " TZCTL_VERSION);
-    app.add_option("--root", given.root, "Work on the system image in this directory");
+    const auto not_empty = [](const std::string& text) {
+        return std::string(text.empty() ? "an empty text" : "");
+    };
+    app.add_option("--root", given.root, "Work on the system image in this directory")
+        ->check(not_empty);
     app.require_subcommand(0, 1);
     app.fallthrough();
 
     app.add_subcommand("status", "Tell what is live and what the next start will do (default)")
         ->add_flag("--json", given.json, "Print a JSON object, for programs");
     auto* const install = app.add_subcommand("install", "Install an update for the next start");
-    install->add_option("DATASET", given.dataset, "Directory that tzctl make has made")->required();
+    install->add_option("DATASET", given.dataset, "Directory that tzctl make has made")
+        ->required()
+        ->check(not_empty);
     install->add_flag("--force", given.forced, "Install it even if no start would adopt it");
     app.add_subcommand("use", "Make an installed update current now, and keep it")
         ->add_option("VERSION", given.version, "Its version; \"system\" for the system's own data")
-        ->required();
+        ->required()
+        ->check(not_empty);
     app.add_subcommand("cleanup", "Delete the updates that are not in use")
         ->add_flag("--dry-run", given.rehearsed, "Only say what would be deleted");
     app.add_subcommand("make", "Make a dataset: see make-dataset(8)")
@@ -115,10 +123,8 @@ void run(const CLI::App& app, const command_line& given) {
 
 // What was printed may still be lost.
 int finish(int status) {
-    errno = 0;
-    std::cout.flush();
-    if (!std::cout) {
-        std::cerr << "tzctl: standard output: " << std::strerror(errno) << '\n';
+    if (!std::cout.flush()) {
+        std::cerr << "tzctl: cannot write to standard output\n";
         return 1;
     }
     return status;

@@ -39,7 +39,7 @@ std::string incompatible(const candidate& one, const candidate& system) {
 }
 
 // Why a start in which nothing fails decides as it does.
-std::string why(const std::string& current_path, const std::string& latest_path) {
+std::string why(const std::string& current_path, const std::string& latest_path) try {
     const candidate system("");
     const candidate current(current_path);
     std::string reason = !current.data.compatible_with(system.data) ? incompatible(current, system)
@@ -59,6 +59,8 @@ std::string why(const std::string& current_path, const std::string& latest_path)
     return reason + (latest.data == current.data
                          ? " The latest update is the same."
                          : " " + latest.name + " is not newer than " + current.name + ".");
+} catch (...) {
+    return "Somebody else changes what it looks at.";
 }
 
 // The line in which `message` was said.
@@ -89,6 +91,15 @@ std::optional<std::string> current_dataset_path() {
     }
 }
 
+std::optional<std::string> latest_dataset_path() {
+    try {
+        const std::string path = read_latest_link();
+        return path.empty() ? std::nullopt : std::optional(path);
+    } catch (...) {
+        return std::nullopt;
+    }
+}
+
 prediction predict_start() {
     const auto links = [] {
         return std::array{target_of(layout::zoneinfo_link), target_of(layout::icu_link),
@@ -96,7 +107,7 @@ prediction predict_start() {
     };
     const auto before = links();
     const std::string current_path = current_dataset_path().value_or("");
-    const std::string latest_path = target_of(layout::latest_link).value_or("");
+    const std::string latest_path = latest_dataset_path().value_or("");
     (void)imagination::take_warnings();
 
     prediction result;
@@ -119,8 +130,9 @@ prediction predict_start() {
     } else if (fell_back != said.end()) {
         result.decided = decision::reset;
         result.reason = "Something fails on the way: " + line_before(said, fell_back);
-    } else if (!result.dataset->empty() && before[0] != after[0]) {
+    } else if (before[0] != after[0] && after[0] != layout::system_zoneinfo) {
         result.decided = decision::adopt;
+        result.dataset = latest_path;
         result.reason = why(current_path, latest_path);
     } else if (invalid != said.end()) {
         result.decided = decision::reset;

@@ -30,8 +30,12 @@ struct prediction {
 /// The whole target of a link as it is imagined now; nothing if there is no link.
 [[nodiscard]] std::optional<std::string> target_of(const char* link);
 
-/// The dataset that the current link names, as it is imagined now: its path, empty for the system's
-/// own data; nothing if the link is missing or names none, for which there is a warning.
+/// The dataset that the current link names, as a start reads it and as it is imagined now: its
+/// path, empty for the system's own data; nothing if the link is missing or names none, for which
+/// there is a warning.
 [[nodiscard]] std::optional<std::string> current_dataset_path();
+
+/// The dataset that the latest link names, in the same way; nothing if there is no such link.
+[[nodiscard]] std::optional<std::string> latest_dataset_path();
 
 } // namespace tz

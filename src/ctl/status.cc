@@ -2,10 +2,8 @@
 #include <algorithm>
 #include <array>
 #include <cstdlib>
-#include <fstream>
 #include <iomanip>
 #include <iostream>
-#include <iterator>
 
 #include <nlohmann/json.hpp>
 #include <unistd.h>
@@ -45,6 +43,9 @@ ordered_json describe(const std::string& path, const kiv_dataset* system) {
         version = dataset.version_string();
         newer = system != nullptr && dataset > *system;
     } catch (const std::out_of_range&) {
+        if (path.empty()) {
+            return nullptr;
+        }
         warn("%s: the version holds a number beyond 2147483647", version.c_str());
     } catch (...) {
         return nullptr;
@@ -103,15 +104,6 @@ ordered_json describe_start(const prediction& start) {
             {"reason", in_utf8(start.reason)}};
 }
 
-ordered_json text_in(const char* path) {
-    std::error_code none;
-    if (!files::is_regular_file(path, none)) {
-        return nullptr;
-    }
-    std::ifstream file(path);
-    return in_utf8(std::string(std::istreambuf_iterator(file), {}));
-}
-
 // The lines said while datasets were looked at, some of them twice; and what no start says.
 ordered_json findings(const ordered_json& found, const std::optional<std::string>& current) {
     ordered_json all = ordered_json::array();
@@ -135,7 +127,9 @@ ordered_json findings(const ordered_json& found, const std::optional<std::string
         "The ICU link has been left behind, for the system's own data is current: tzctl use system "
         "mends that.");
     add(links["tz_latest"]["state"] == "dangling", "The latest link leads nowhere.");
-    add(links["localtime"]["state"] == "dangling",
+    std::error_code none;
+    add(links["localtime"]["state"] != "missing" &&
+            !files::is_regular_file(layout::localtime_link, none),
         "The local-time link leads to no zone file: local time is UTC.");
     return all;
 }
@@ -151,21 +145,22 @@ ordered_json survey(prediction& next_start) {
     }
     const kiv_dataset* const reference = system ? &*system : nullptr;
     const auto current = current_dataset_path();
-    const auto latest = target_of(layout::latest_link);
-    ordered_json found{{"format", 1},
-                       {"system", system ? describe("", reference) : nullptr},
-                       {"current", current ? describe(*current, reference) : nullptr},
-                       {"latest", latest ? describe(*latest, reference) : nullptr},
-                       {"installed", describe_installed(reference)},
-                       {"links",
-                        {{"zoneinfo", describe_link(layout::zoneinfo_link)},
-                         {"icutz", describe_link(layout::icu_link)},
-                         {"tz_latest", describe_link(layout::latest_link)},
-                         {"localtime", describe_link(layout::localtime_link)}}},
-                       {"marker", fs::exists(layout::cleanup_marker)},
-                       {"record", text_in(layout::version_diff_record)},
-                       {"next_start", nullptr},
-                       {"findings", nullptr}};
+    const auto latest = latest_dataset_path();
+    ordered_json found{
+        {"format", 1},
+        {"system", system ? describe("", reference) : nullptr},
+        {"current", current ? describe(*current, reference) : nullptr},
+        {"latest", latest ? describe(*latest, reference) : nullptr},
+        {"installed", describe_installed(reference)},
+        {"links",
+         {{"zoneinfo", describe_link(layout::zoneinfo_link)},
+          {"icutz", describe_link(layout::icu_link)},
+          {"tz_latest", describe_link(layout::latest_link)},
+          {"localtime", describe_link(layout::localtime_link)}}},
+        {"marker", fs::exists(layout::cleanup_marker)},
+        {"record", text_or_null(updates::first_bytes(layout::version_diff_record, 4096))},
+        {"next_start", nullptr},
+        {"findings", nullptr}};
     found["findings"] = findings(found, current);
     next_start = predict_start();
     found["next_start"] = describe_start(next_start);
@@ -197,8 +192,11 @@ void print_title(const std::string& title) {
 
 std::vector<std::string> removable_paths() {
     try {
-        const auto directories = updates::removable();
-        return {directories.begin(), directories.end()};
+        std::vector<std::string> paths;
+        for (const auto& directory : updates::removable()) {
+            paths.push_back(in_utf8(directory));
+        }
+        return paths;
     } catch (const std::exception&) {
         return {}; // tzctl cleanup says why
     }

@@ -58,21 +58,23 @@ std::string wrapped(const std::string& text, std::size_t indent) {
     return lines + line + "\n";
 }
 
-std::string dataset_name(const std::string& path) {
+std::string dataset_name(const std::optional<std::string>& path) {
     constexpr std::string_view prefix = layout::updates_directory;
-    return path.empty() ? "the system's own data" : "update " + path.substr(prefix.size());
+    return !path           ? "what the current link names"
+           : path->empty() ? "the system's own data"
+                           : "update " + path->substr(prefix.size());
 }
 
 std::string headline(const prediction& start) {
     switch (start.decided) {
     case decision::keep:
-        return "keeps " + dataset_name(*start.dataset);
+        return "keeps " + dataset_name(start.dataset);
     case decision::adopt:
-        return "adopts " + dataset_name(*start.dataset);
+        return "adopts " + dataset_name(start.dataset);
     case decision::drop:
-        return "drops the current update for " + dataset_name(*start.dataset);
+        return "drops the current update for " + dataset_name(start.dataset);
     case decision::reset:
-        return "goes back to " + dataset_name(*start.dataset);
+        return "goes back to " + dataset_name(start.dataset);
     case decision::fail:
         break;
     }

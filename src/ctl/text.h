@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #pragma once
 
+#include <optional>
 #include <string>
 
 #include "ctl/prediction.h"
@@ -17,8 +18,8 @@ namespace tz {
 /// blanks.
 [[nodiscard]] std::string wrapped(const std::string& text, std::size_t indent = 0);
 
-/// What people call the dataset at `path`.
-[[nodiscard]] std::string dataset_name(const std::string& path);
+/// What people call the dataset at `path`, if that is known.
+[[nodiscard]] std::string dataset_name(const std::optional<std::string>& path);
 
 /// What a start does, in a few words, such as "adopts update 2016d.1.0".
 [[nodiscard]] std::string headline(const prediction& start);

@@ -2,19 +2,19 @@
 #include "ctl/updates.h"
 
 #include <algorithm>
-#include <array>
 #include <cerrno>
 #include <csignal>
-#include <fstream>
-#include <string_view>
+#include <stdexcept>
 #include <system_error>
 
 #include <fcntl.h>
 #include <sys/file.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include "ctl/prediction.h"
 #include "fs/layout.h"
+#include "platform/imagination.h"
 
 namespace tz::updates {
 namespace {
@@ -23,32 +23,26 @@ namespace files = std::filesystem;
 
 volatile std::sig_atomic_t asked_to_end = 0;
 
+// Beside a link: what it will be, and what it was.
+constexpr char wanted_suffix[] = ".tzctl-new";
+constexpr char former_suffix[] = ".tzctl-old";
+
+const files::path directory_of_updates = files::path(layout::updates_directory).parent_path();
+
 // Whether `path` is `directory` or lies below it.
 bool is_within(const files::path& path, const files::path& directory) {
     return std::mismatch(directory.begin(), directory.end(), path.begin(), path.end()).first ==
            directory.end();
 }
 
-// Where a link that says `target` leads in the end, as far as that exists.
-files::path final_place(const files::path& target) {
-    std::error_code failure;
-    auto place = files::weakly_canonical(target, failure);
-    if (failure && failure != std::errc::too_many_symbolic_link_levels) {
-        throw files::filesystem_error("cannot follow a link", target, failure);
-    }
-    return place;
-}
-
-// All that the links of the state directory say, and where they lead in the end. Throws a refusal
-// if that cannot be told.
-std::vector<files::path> places_in_use() {
-    std::vector<files::path> places;
+// All by which the links of the state directory lead. Throws if that cannot be told.
+std::vector<std::string> places_in_use() {
+    std::vector<std::string> places;
     for (const char* link :
          {layout::zoneinfo_link, layout::icu_link, layout::latest_link, layout::localtime_link}) {
-        if (const auto text = target_of(link)) {
-            const auto target = layout::state_directory / files::path(*text);
-            places.push_back(target.lexically_normal());
-            places.push_back(final_place(target));
+        if (target_of(link)) {
+            const auto way = imagination::way_to(link);
+            places.insert(places.end(), way.begin(), way.end());
         } else if (errno == EINVAL ? link == layout::latest_link : errno != ENOENT) {
             throw std::runtime_error(std::string(link) +
                                      " cannot be read, so nothing is known to be unused");
@@ -57,20 +51,38 @@ std::vector<files::path> places_in_use() {
     return places;
 }
 
-bool is_zone_file(const files::directory_entry& entry) {
-    constexpr std::string_view magic = "TZif";
-    std::array<char, magic.size()> start{};
+void refuse_link() {
+    if (files::is_symlink(directory_of_updates)) {
+        throw std::runtime_error(
+            "the directory of updates is a link, through which nothing is changed");
+    }
+}
+
+void make_beside(const std::string& path, const char* suffix,
+                 const std::optional<std::string>& target) {
+    if (target) {
+        check(::symlink(target->c_str(), (path + suffix).c_str()), path);
+    }
+}
+
+// What lies beside takes the place of the link; if nothing does, the link goes. The result is as of
+// rename(2).
+int take_from_beside(const std::string& path, const char* suffix) {
+    const int result = ::rename((path + suffix).c_str(), path.c_str());
+    return result == -1 && errno == ENOENT ? ::unlink(path.c_str()) : result;
+}
+
+void delete_what_is_half_made() {
     std::error_code none;
-    return entry.is_regular_file(none) &&
-           std::ifstream(entry.path()).read(start.data(), start.size()) &&
-           std::string_view(start.data(), start.size()) == magic;
+    files::remove_all(staging, none);
+    for (const char* link : {layout::zoneinfo_link, layout::icu_link, layout::latest_link}) {
+        for (const char* suffix : {wanted_suffix, former_suffix}) {
+            files::remove(std::string(link) + suffix, none);
+        }
+    }
 }
 
 } // namespace
-
-files::path staging_directory() {
-    return files::path(layout::updates_directory) / ".tzctl";
-}
 
 std::string path_of(const std::string& version) {
     return layout::updates_directory + version;
@@ -80,7 +92,7 @@ std::vector<files::path> installed() {
     std::vector<files::path> found;
     std::error_code none;
     for (const auto& entry : files::directory_iterator(layout::updates_directory, none)) {
-        if (entry.is_directory(none) && entry.path() != staging_directory()) {
+        if (entry.is_directory(none) && entry.path().filename() != staging) {
             found.push_back(entry.path());
         }
     }
@@ -89,60 +101,96 @@ std::vector<files::path> installed() {
 }
 
 std::vector<files::path> removable() {
+    imagination::forget();
     if (!current_dataset_path()) {
         throw std::runtime_error(
             "the current link cannot be read, so nothing is known to be unused");
     }
-    if (files::is_symlink(files::path(layout::updates_directory).parent_path())) {
-        throw std::runtime_error(
-            "the directory of updates is a link, through which nothing is deleted");
-    }
+    refuse_link();
     auto found = installed();
     const auto in_use = places_in_use();
     std::erase_if(found, [&](const auto& directory) {
         return files::is_symlink(directory) ||
                std::any_of(in_use.begin(), in_use.end(), [&](const auto& place) {
-                   return is_within(place, directory) ||
-                          is_within(place, files::canonical(directory));
+                   return is_within(place, files::canonical(directory));
                });
     });
     return found;
 }
 
-bool holds_zones(const files::path& directory) {
-    std::error_code none;
-    const files::recursive_directory_iterator entries(
-        directory, files::directory_options::skip_permission_denied, none);
-    return std::any_of(begin(entries), end(entries), is_zone_file);
+std::optional<std::string> first_bytes(const std::string& path, std::size_t most) {
+    const fs::descriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY));
+    struct stat status {};
+    if (!file.is_open() || ::fstat(file.number(), &status) == -1 || !S_ISREG(status.st_mode)) {
+        return std::nullopt;
+    }
+    std::string text(most, '\0');
+    const auto length = ::read(file.number(), text.data(), text.size());
+    return length == -1 ? std::nullopt
+                        : std::optional(text.substr(0, static_cast<std::size_t>(length)));
 }
 
-void replace_link(const std::string& target, const files::path& path) {
-    const auto beside = files::path(path) += ".tzctl";
-    files::remove(beside);
-    files::create_symlink(target, beside);
+bool holds_zones(const std::string& directory) {
+    std::error_code failure;
+    for (files::recursive_directory_iterator at(directory, failure), end; !failure && at != end;
+         at.increment(failure)) {
+        if (first_bytes(at->path(), 4) == "TZif") {
+            return true;
+        }
+    }
+    return false;
+}
+
+void replace(const links& wanted) {
+    imagination::forget();
+    for (const auto& [path, target] : wanted) { // all that needs room
+        make_beside(path, wanted_suffix, target);
+        make_beside(path, former_suffix, target_of(path.c_str()));
+    }
     try {
-        files::rename(beside, path);
+        for (const auto& [path, target] : wanted) {
+            check(take_from_beside(path, wanted_suffix), path);
+        }
     } catch (...) {
-        files::remove(beside);
+        for (const auto& [path, target] : wanted) {
+            (void)take_from_beside(path, former_suffix);
+        }
         throw;
     }
+    ::sync();
 }
 
-work::work() : lock_(::open(layout::state_directory, O_RDONLY | O_DIRECTORY | O_CLOEXEC)) {
+void check(int result, const std::string& what) {
+    if (result == -1) {
+        throw std::system_error(errno, std::generic_category(), what);
+    }
+}
+
+work::work()
+    : lock_(::open(layout::state_directory, O_RDONLY | O_DIRECTORY | O_CLOEXEC)),
+      updates_(
+          ::open(directory_of_updates.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC)) {
     for (const int signal : {SIGHUP, SIGINT, SIGTERM}) {
-        (void)std::signal(signal, [](int) { asked_to_end = 1; });
+        if (std::signal(signal, [](int) { asked_to_end = 1; }) == SIG_IGN) {
+            (void)std::signal(signal, SIG_IGN);
+        }
     }
-    if (!lock_.is_open() || ::flock(lock_.number(), LOCK_EX | LOCK_NB) == -1) {
-        throw std::system_error(errno, std::generic_category(),
-                                errno == EWOULDBLOCK ? "another tzctl is at work"
-                                                     : layout::state_directory);
+    refuse_link();
+    if (::flock(lock_.number(), LOCK_EX | LOCK_NB) == -1) {
+        check(-1, errno == EWOULDBLOCK ? "another tzctl is at work" : layout::state_directory);
     }
-    files::remove_all(staging_directory());
+    return_to_updates();
+    delete_what_is_half_made();
 }
 
 work::~work() {
-    std::error_code none;
-    files::remove_all(staging_directory(), none);
+    if (::fchdir(updates_.number()) == 0) {
+        delete_what_is_half_made();
+    }
+}
+
+void work::return_to_updates() const {
+    check(::fchdir(updates_.number()), directory_of_updates);
 }
 
 void end_if_interrupted() {

@@ -2,17 +2,20 @@
 #pragma once
 
 #include <filesystem>
+#include <functional>
+#include <map>
+#include <optional>
 #include <string>
 #include <vector>
 
 #include "fs/descriptor.h"
 
-/// What the updater's verbs do to the disk, in earnest. Failures are thrown as std::exception,
-/// whose text is for people.
+/// What the updater's verbs do to the disk, in earnest. Refusals and failures are thrown as
+/// std::exception, whose text is for people.
 namespace tz::updates {
 
-/// Where a directory of updates keeps what is half-made or half-deleted.
-[[nodiscard]] std::filesystem::path staging_directory();
+/// The name that what is half-made or half-deleted has in the directory of updates.
+inline constexpr char staging[] = ".tzctl";
 
 /// The directory of the update of this version; the path of the system's own data is empty.
 [[nodiscard]] std::string path_of(const std::string& version);
@@ -20,18 +23,31 @@ namespace tz::updates {
 /// The directories of the installed updates in the order of their names; a link to one counts, too.
 [[nodiscard]] std::vector<std::filesystem::path> installed();
 
-/// The installed updates into which no link of the state directory leads, and that are directories
+/// The installed updates by which no link of the state directory leads, and that are directories
 /// themselves. Throws while that cannot be told.
 [[nodiscard]] std::vector<std::filesystem::path> removable();
 
+/// The first bytes of the regular file at `path`, at most as many; nothing if there is none, or it
+/// cannot be read.
+[[nodiscard]] std::optional<std::string> first_bytes(const std::string& path, std::size_t most);
+
 /// Whether there is a compiled zone file in `directory` or below.
-[[nodiscard]] bool holds_zones(const std::filesystem::path& directory);
+[[nodiscard]] bool holds_zones(const std::string& directory);
 
-/// Makes the link `path` say `target`, in one step: nobody ever finds no link there.
-void replace_link(const std::string& target, const std::filesystem::path& path);
+/// Links by their paths, with their targets; without one there is to be no link. The order is that in
+/// which they are replaced, with zoneinfo before icutz, as a start does.
+using links = std::map<std::string, std::optional<std::string>, std::greater<>>;
 
-/// As long as this lives, no other tzctl changes anything, and no interruption ends this one before
-/// it has put things in order. Nothing half-made is there before or after.
+/// Replaces each link in one step: nobody ever finds none where one was and will be. If that fails,
+/// all are as before.
+void replace(const links& wanted);
+
+/// Throws what `errno` says of `what`, if `result` is -1.
+void check(int result, const std::string& what);
+
+/// As long as this lives, no other tzctl changes anything, no interruption ends this one before it
+/// has put things in order, and the working directory is that of the updates: it may belong to
+/// somebody who puts a link in its place meanwhile. Nothing half-made is there before or after.
 class work {
   public:
     work();
@@ -39,8 +55,12 @@ class work {
     work& operator=(const work&) = delete;
     ~work();
 
+    /// Goes back to the directory of updates.
+    void return_to_updates() const;
+
   private:
     fs::descriptor lock_;
+    fs::descriptor updates_;
 };
 
 /// Throws if there was an interruption during the work.

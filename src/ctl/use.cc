@@ -1,10 +1,8 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #include <filesystem>
 #include <iostream>
-#include <map>
 #include <optional>
-
-#include <unistd.h>
+#include <stdexcept>
 
 #include "ctl/prediction.h"
 #include "ctl/text.h"
@@ -20,12 +18,13 @@ namespace {
 
 namespace files = std::filesystem;
 
-// The path of a dataset that is there, and that others can read.
+// The path of a dataset that is there.
 std::string checked_path(const std::string& version) {
     const bool system = version == "system";
     std::string path = system ? "" : updates::path_of(version);
-    if (!system && (files::path(version).filename() != version || !files::is_directory(path))) {
-        throw std::runtime_error(version + " is not installed");
+    if (!system && (version.empty() || version[0] == '.' ||
+                    files::path(version).filename() != version || !files::is_directory(path))) {
+        throw std::runtime_error("\"" + version + "\" is not installed");
     }
     if (!updates::holds_zones(system ? layout::system_zoneinfo : path + layout::update_zoneinfo)) {
         throw std::runtime_error(dataset_name(path) + " holds no tz database that can be read");
@@ -33,8 +32,8 @@ std::string checked_path(const std::string& version) {
     return path;
 }
 
-// The changes that make the dataset at `path` current and the latest.
-imagination::changes imagine_use(const std::string& path) {
+// The links that are to be changed for the dataset at `path` to be current and the latest.
+updates::links imagine_use(const std::string& path) {
     imagination::forget();
     try {
         kiv_dataset(path).make_current();
@@ -46,34 +45,12 @@ imagination::changes imagine_use(const std::string& path) {
         const auto said = imagination::take_warnings();
         throw std::runtime_error(said.empty() ? "its version cannot be read" : said.back());
     }
-    return imagination::noted();
-}
-
-void set_link(const std::string& path, const std::optional<std::string>& target) {
-    if (target) {
-        updates::replace_link(*target, path);
-    } else {
-        files::remove(path);
+    updates::links wanted;
+    for (const auto& [link, change] : imagination::noted()) {
+        const bool gone = change.what == imagination::entry::kind::nothing;
+        wanted[link] = gone ? std::nullopt : std::optional(change.target);
     }
-}
-
-// All of the changes, or none.
-void carry_out(const imagination::changes& changes) {
-    imagination::forget();
-    std::map<std::string, std::optional<std::string>> before;
-    try {
-        for (const auto& [path, change] : changes) {
-            before[path] = target_of(path.c_str());
-            const bool link = change.what == imagination::entry::kind::link;
-            set_link(path, link ? std::optional(change.target) : std::nullopt);
-        }
-    } catch (...) {
-        for (const auto& [path, target] : before) {
-            set_link(path, target);
-        }
-        throw;
-    }
-    ::sync();
+    return wanted;
 }
 
 } // namespace
@@ -81,12 +58,15 @@ void carry_out(const imagination::changes& changes) {
 void use(const std::string& version) {
     const updates::work work;
     const std::string path = checked_path(version);
-    const auto changes = imagine_use(path);
-    if (const auto start = predict_start(); start.dataset != path) {
+    const auto wanted = imagine_use(path);
+    const auto start = predict_start();
+    const bool way_out = path.empty(); // also where no start goes well any more
+    if (start.dataset != path || (start.decided != decision::keep && !way_out)) {
         throw std::runtime_error("the next start would not keep it. " + start.reason);
     }
-    carry_out(changes);
+    updates::replace(wanted);
     std::cout << "Current now: " << printable(dataset_name(path)) << ".\n"
+              << wrapped("The next start " + headline(start) + ". " + start.reason)
               << "Programs that run already keep what they have read.\n";
 }
 

@@ -6,12 +6,14 @@
 #include <cerrno>
 #include <climits>
 #include <cstdarg>
+#include <cstdint>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <filesystem>
 #include <optional>
 #include <string_view>
+#include <system_error>
 #include <utility>
 
 #include <fcntl.h>
@@ -90,7 +92,8 @@ std::optional<place> step(const place& at, const std::string& name) {
 // The place that an absolute path leads to, element by element, as the kernel goes: the last
 // element may be absent, and if it is a link, that is followed or not. Nothing, with errno set, if
 // the path leads nowhere.
-std::optional<place> find(std::string path, bool follow_last) {
+std::optional<place> find(std::string path, bool follow_last,
+                          std::vector<std::string>* passed = nullptr) {
     constexpr int most_links = 40; // that Linux follows
     int links = 0;
     place at{"", kind::directory};
@@ -102,6 +105,9 @@ std::optional<place> find(std::string path, bool follow_last) {
         auto next = step(at, name);
         if (!next) {
             return std::nullopt;
+        }
+        if (passed != nullptr) {
+            passed->push_back(next->path);
         }
         if (next->what == kind::link && (!last || follow_last)) {
             if (++links > most_links) {
@@ -124,6 +130,13 @@ bool is_read_only(const place& where) {
     struct statvfs status {};
     return ::statvfs((parent_of(where.path) + "/").c_str(), &status) == 0 &&
            (status.f_flag & ST_RDONLY) != 0;
+}
+
+// Whether the entry at `path` has one of these of statx's attributes.
+bool has(std::uint64_t attributes, const std::string& path) {
+    struct statx status {};
+    return ::statx(AT_FDCWD, path.c_str(), AT_SYMLINK_NOFOLLOW, STATX_TYPE, &status) == 0 &&
+           (status.stx_attributes & attributes) != 0;
 }
 
 bool is_empty(const place& directory) {
@@ -152,6 +165,13 @@ int remove_entry(const char* path, bool directory_allowed) {
     if (found->what == kind::nothing) {
         return fail(ENOENT);
     }
+    constexpr auto unchangeable = STATX_ATTR_IMMUTABLE | STATX_ATTR_APPEND; // see chattr(1)
+    if (has(unchangeable, parent_of(found->path) + "/") || has(unchangeable, found->path)) {
+        return fail(EPERM);
+    }
+    if (has(STATX_ATTR_MOUNT_ROOT, found->path)) {
+        return fail(EBUSY);
+    }
     if (found->what == kind::directory && !(directory_allowed && is_empty(*found))) {
         return fail(directory_allowed ? ENOTEMPTY : EISDIR);
     }
@@ -172,6 +192,14 @@ const imagination::changes& imagination::noted() {
 
 std::vector<std::string> imagination::take_warnings() {
     return std::exchange(warnings, {});
+}
+
+std::vector<std::string> imagination::way_to(const std::string& path) {
+    std::vector<std::string> passed;
+    if (!find(path, true, &passed) && errno != ENOENT && errno != ENOTDIR && errno != ELOOP) {
+        throw std::system_error(errno, std::generic_category(), path);
+    }
+    return passed;
 }
 
 int platform::access(const char* path, int /*mode*/) {
@@ -207,6 +235,9 @@ int platform::symlink(const char* target, const char* link_path) {
     }
     if (is_read_only(*found)) {
         return fail(EROFS);
+    }
+    if (has(STATX_ATTR_IMMUTABLE, parent_of(found->path) + "/")) {
+        return fail(EPERM);
     }
     imagined[found->path] = {kind::link, target};
     return succeed();

@@ -11,7 +11,8 @@
 /// the shared code can be run to see what it would do.
 ///
 /// A change is imagined to succeed unless what lies on the disk forbids it, as it would for root:
-/// an entry in the way, a directory, a file system mounted read-only. Full disks are not foreseen.
+/// an entry in the way, a directory, a mount point, a file system mounted read-only, an attribute
+/// set by chattr(1). Full disks are not foreseen.
 namespace tz::imagination {
 
 /// What is imagined at a place on the disk.
@@ -34,5 +35,9 @@ void forget();
 /// The warning lines since the last call, without the program's name, and with a reason only where
 /// the last call failed.
 [[nodiscard]] std::vector<std::string> take_warnings();
+
+/// Every place, as in `changes`, that is passed on the way to `path`: links, and what they lead to,
+/// as far as that is there. Throws std::system_error if that cannot be told.
+[[nodiscard]] std::vector<std::string> way_to(const std::string& path);
 
 } // namespace tz::imagination
