@@ -7,26 +7,33 @@ _tzctl() {
     COMPREPLY=()
     for ((i = 1; i < COMP_CWORD; i++)); do
         case ${COMP_WORDS[i]} in
-        --root) root=${COMP_WORDS[++i]} ;;
-        -*) ;;
+        --root | =) root=${COMP_WORDS[i + 1]} ;;
+        "$root" | -*) ;;
         *) verb=${verb:-${COMP_WORDS[i]}} ;;
         esac
     done
 
-    local words='' directories=
+    local words=() directories='' name
     case $before,$verb in
-    --root,*) directories=yes ;;
-    *,) words='status install use cleanup make --root --help --version' ;;
-    *,status) words='--json --root' ;;
-    *,install) words='--force --root' directories=yes ;;
-    *,use) words="system $(cd "$root/var/db/timezone/tz" 2>/dev/null && echo *)" ;;
-    *,cleanup) words='--dry-run --root' ;;
-    make,make) words='update system' ;;
+    --root,* | =,*) directories=yes ;;
+    *,) words=(status install use cleanup make --root --help --version) ;;
+    *,status) words=(--json --root) ;;
+    *,install) words=(--force --root) directories=yes ;;
+    *,use)
+        words=(system)
+        for name in "$root"/var/db/timezone/tz/*; do # it may be anybody's, and hold a command
+            [[ ! ${name##*/} =~ ^[0-9a-z.]+$ ]] || words+=("${name##*/}")
+        done
+        ;;
+    *,cleanup) words=(--dry-run --root) ;;
+    make,make) words=(update system) ;;
     *,make) compopt -o default ;;
     esac
-    mapfile -t COMPREPLY < <(compgen -W "$words" -- "$word")
+    [ -z "$directories" ] || compopt -o filenames
+    for name in "${words[@]}"; do
+        [[ $name != "$word"* ]] || COMPREPLY+=("$name")
+    done
     if [ -n "$directories" ]; then
-        compopt -o filenames
         mapfile -t -O "${#COMPREPLY[@]}" COMPREPLY < <(compgen -d -- "$word")
     fi
 }
