@@ -34,8 +34,8 @@ inline constexpr char staging[] = ".tzctl";
 /// Whether there is a compiled zone file in `directory` or below.
 [[nodiscard]] bool holds_zones(const std::string& directory);
 
-/// Links by their paths, with their targets; without one there is to be no link. The order is that in
-/// which they are replaced, with zoneinfo before icutz, as a start does.
+/// Links by their paths, with their targets; without one there is to be no link. The order is that
+/// in which they are replaced, with zoneinfo before icutz, as a start does.
 using links = std::map<std::string, std::optional<std::string>, std::greater<>>;
 
 /// Replaces each link in one step: nobody ever finds none where one was and will be. If that fails,
