@@ -64,7 +64,8 @@ mv 2016h 2016H; ctl install 2016H|1|"2016H" is not a version
 mv 2016h 20160000000h; ctl install 20160000000h|1|a number beyond 2147483647
 mv 2016h 2016g; ctl install 2016g|1|2016g is installed already
 mkfifo 2016h/zoneinfo/pipe; ctl install 2016h|1|pipe is neither a file
-mv $state/tz root/; ln -s /tz $state/tz; ctl install 2016h|1|is a link
+mv $state/tz root/; ln -s /tz $state/tz; ctl install 2016h|1|a link perhaps
+rm -r $state; ctl install 2016h|1|timezone/: No such file
 rm -r 2016h/zoneinfo; ctl install --force 2016h|0|holds no tz database|2016d/zoneinfo 2016d/icutz 2016h 2016b 2016d 2016e 2016f 2016g 2016h
 ctl install missing|1|missing: No such file
 rm $state/tz_latest; mkdir $state/tz_latest; ctl install 2016h|1|tz_latest
@@ -85,7 +86,7 @@ mv $state/tz/2016b root/; ln -s ../../../../2016b $state/tz/2016b; ctl cleanup &
 ln -sfn 2016g $state/tz/2016d; rm -r $state/tz/2016d/2016g; ln -sfn tz/2016d/../2016b $state/tz_latest; ctl cleanup|0|2016e|2016d/zoneinfo 2016d/icutz tz/2016d/../2016b 2016b 2016d
 ln -sfn nowhere $state/zoneinfo; ctl cleanup|1|current link cannot be read
 rm $state/tz_latest; touch $state/tz_latest; ctl cleanup|1|tz_latest cannot be read
-mv $state/tz root/; ln -s /tz $state/tz; ctl cleanup|1|is a link
+mv $state/tz root/; ln -s /tz $state/tz; ctl cleanup|1|a link perhaps
 exec {lock}<$state; flock $lock; ctl install 2016h|1|another tzctl is at work
 ctl status >/dev/full|1|standard output
 ctl --version >&-|1|standard output

@@ -243,8 +243,11 @@ void print_link(const std::string& name, const ordered_json& link) {
 void print(const ordered_json& survey, const prediction& next) {
     print_title("The next start " + printable(headline(next)) + ".");
     std::cout << wrapped(next.reason, 2);
+    if (!next.warnings.empty()) {
+        print_title("It will say");
+    }
     for (const auto& line : next.warnings) {
-        std::cout << wrapped("It will say: " + line, 2);
+        std::cout << wrapped(line, 2);
     }
     print_title("Datasets          release  schema  compatible  newer");
     for (const auto& dataset : survey["installed"]) {

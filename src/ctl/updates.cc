@@ -51,11 +51,14 @@ std::vector<std::string> places_in_use() {
     return places;
 }
 
-void refuse_link() {
-    if (files::is_symlink(directory_of_updates)) {
-        throw std::runtime_error(
-            "the directory of updates is a link, through which nothing is changed");
+int open_directory(const std::string& path) {
+    const int directory = ::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
+    if (directory == -1 && errno == ENOTDIR) {
+        throw std::runtime_error(path + " is not a directory, but a link perhaps, through which "
+                                        "nothing is changed");
     }
+    check(directory, path);
+    return directory;
 }
 
 void make_beside(const std::string& path, const char* suffix,
@@ -106,7 +109,7 @@ std::vector<files::path> removable() {
         throw std::runtime_error(
             "the current link cannot be read, so nothing is known to be unused");
     }
-    refuse_link();
+    const fs::descriptor updates(open_directory(directory_of_updates)); // is one
     auto found = installed();
     const auto in_use = places_in_use();
     std::erase_if(found, [&](const auto& directory) {
@@ -167,15 +170,13 @@ void check(int result, const std::string& what) {
 }
 
 work::work()
-    : lock_(::open(layout::state_directory, O_RDONLY | O_DIRECTORY | O_CLOEXEC)),
-      updates_(
-          ::open(directory_of_updates.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC)) {
+    : lock_(open_directory(layout::state_directory)),
+      updates_(open_directory(directory_of_updates)) {
     for (const int signal : {SIGHUP, SIGINT, SIGTERM}) {
         if (std::signal(signal, [](int) { asked_to_end = 1; }) == SIG_IGN) {
             (void)std::signal(signal, SIG_IGN);
         }
     }
-    refuse_link();
     if (::flock(lock_.number(), LOCK_EX | LOCK_NB) == -1) {
         check(-1, errno == EWOULDBLOCK ? "another tzctl is at work" : layout::state_directory);
     }
