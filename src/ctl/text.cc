@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #include "ctl/text.h"
 
+#include <array>
 #include <sstream>
 #include <string_view>
 
@@ -66,19 +67,11 @@ std::string dataset_name(const std::optional<std::string>& path) {
 }
 
 std::string headline(const prediction& start) {
-    switch (start.decided) {
-    case decision::keep:
-        return "keeps " + dataset_name(start.dataset);
-    case decision::adopt:
-        return "adopts " + dataset_name(start.dataset);
-    case decision::drop:
-        return "drops the current update for " + dataset_name(start.dataset);
-    case decision::reset:
-        return "goes back to " + dataset_name(start.dataset);
-    case decision::fail:
-        break;
-    }
-    return "fails";
+    constexpr std::array verbs{"keeps ", "adopts ", "drops the current update for ",
+                               "goes back to "};
+    return start.decided == decision::fail
+               ? "fails"
+               : verbs.at(static_cast<std::size_t>(start.decided)) + dataset_name(start.dataset);
 }
 
 } // namespace tz

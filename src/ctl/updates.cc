@@ -29,12 +29,6 @@ constexpr char former_suffix[] = ".tzctl-old";
 
 const files::path directory_of_updates = files::path(layout::updates_directory).parent_path();
 
-// Whether `path` is `directory` or lies below it.
-bool is_within(const files::path& path, const files::path& directory) {
-    return std::mismatch(directory.begin(), directory.end(), path.begin(), path.end()).first ==
-           directory.end();
-}
-
 // All by which the links of the state directory lead. Throws if that cannot be told.
 std::vector<std::string> places_in_use() {
     std::vector<std::string> places;
@@ -115,7 +109,7 @@ std::vector<files::path> removable() {
     std::erase_if(found, [&](const auto& directory) {
         return files::is_symlink(directory) ||
                std::any_of(in_use.begin(), in_use.end(), [&](const auto& place) {
-                   return is_within(place, files::canonical(directory));
+                   return (place + "/").starts_with(files::canonical(directory).string() + "/");
                });
     });
     return found;
