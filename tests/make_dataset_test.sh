@@ -13,11 +13,12 @@ make() { "$tool" "$@"; }
 fail() { echo "$*" >&2 && exit 1; }
 
 export TMPDIR="$work/tmp"
-mkdir -p tmp none two misnamed out dying deb/usr/share/zoneinfo table/zone.tab
+mkdir -p tmp none two misnamed out dying deb/usr/share/zoneinfo table/zone.tab cut
 touch two/icutz44l.dat two/icutz44b.dat misnamed/icutz44x.dat
 for release in 2016b 2016B 2147483648b; do echo "# version $release" >$release; done
 (cat 2016b && echo Z A/B nonsense) >nonsense
-(cat 2016b && echo Z A/B 0 - UTC) | tee deb/usr/share/zoneinfo/tzdata.zi table/tzdata.zi >/dev/null
+(cat 2016b && echo Z A/B 0 - UTC) | tee deb/usr/share/zoneinfo/tzdata.zi table/tzdata.zi cut/tzdata.zi >/dev/null
+printf '# XX\n\t\tA/B\n\t\tC/D\n' >cut/zone1970.tab
 echo AB >deb/usr/share/zoneinfo/zone.tab
 (echo '# version 9999a' && echo Z A/B 0 - UTC) >9999a.zi
 # shellcheck disable=SC2016 # expanded by what is written
@@ -89,6 +90,7 @@ sh without-zic update deb one out/2016b|zic: not found
 sh without-icupkg update deb one out/2016b|icupkg: not found
 make update deb one none/none/2016b|none/none: cannot be written to
 make update 2016b one out/2016b|2016b: holds no zone
+make update cut/tzdata.zi one out/2016b|cut/tzdata.zi: holds no C/D, unlike its zone1970.tab
 make system deb -one out/share|-one: begins with '-' or holds a newline
 make update nonsense one out/2016b|nonsense: zic cannot compile it
 PATH=dying:$PATH make update deb one out/2016b|dying
