@@ -35,8 +35,9 @@ lay_out() {
 }
 
 ctl() { "$tzctl" --root root "$@"; }
-plain_and_narrow() { if ctl | grep -P '\x1b|.{81}'; then return 1; fi; echo fits; }
-told() { ctl status --json | jq -r "$1"; }
+in_order() { if ctl | grep -P '\x1b|.{81}|not as it should'; then return 1; fi; echo fits; }
+coloured_lines() { env "$@" script -qec "'$tzctl' --root root" /dev/null | grep -c $'\e'; }
+told() { ctl status --json | jq -cr "$1"; }
 left() { # the versions in the links, and the updates
     for link in $state/{zoneinfo,icutz,tz_latest}; do readlink "$link" || echo none; done |
         sed 's:/var/db/timezone/tz/::; s:/usr/share/::' | paste -s -d ' '
@@ -46,9 +47,9 @@ left() { # the versions in the links, and the updates
 # Before the commands something may be changed. Unless they succeed, nothing else may be.
 while IFS='|' read -r commands status said after; do
     lay_out
-    case $commands in *';'*) eval "${commands%;*}" ;; esac
+    case $commands in *';'*) eval "${commands%;*}" >/dev/null ;; esac
     before=$(left)
-    (eval "${commands##*;}") >output 2>&1 && actual=0 || actual=$?
+    (eval "${commands##*;}") </dev/null >output 2>&1 && actual=0 || actual=$?
     [ "$actual" = "$status" ] || fail "$commands: exit status $actual: $(cat output)"
     grep -qF -- "$said" output || fail "$commands: $(cat output)"
     [ "$(left | xargs)" = "${after:-$(echo "$before" | xargs)}" ] || fail "$commands: left $(left)"
@@ -72,6 +73,7 @@ rm $state/tz_latest; mkdir $state/tz_latest; ctl install 2016h|1|tz_latest
 ctl use 2016f|0|Current now: update 2016f.|2016f/zoneinfo 2016f/icutz 2016f 2016b 2016d 2016e 2016f 2016g
 ctl use 2016f && told .next_start.decision|0|keep|2016f/zoneinfo 2016f/icutz 2016f 2016b 2016d 2016e 2016f 2016g
 ctl use system && told .next_start.decision|0|keep|zoneinfo.default none none 2016b 2016d 2016e 2016f 2016g
+ln -s x $state/zoneinfo.tzctl-new; ln -s x $state/icutz.tzctl-old; ln -s x $state/tz_latest.tzctl-new; ctl use 2016f|0|Current now|2016f/zoneinfo 2016f/icutz 2016f 2016b 2016d 2016e 2016f 2016g
 ctl use 2016b|1|2016c.1.0 (the system's own data) is newer than 2016b.
 ctl use 2016e|1|2016e has ICU schema 44b
 ctl use 2016h|1|"2016h" is not installed
@@ -80,6 +82,8 @@ ctl use ../tz/2016f|1|is not installed
 rm -r $state/tz/2016f/zoneinfo; ctl use 2016f|1|holds no tz database
 rm $state/icutz; mkdir $state/icutz; ctl use 2016f|1|File exists
 ctl cleanup --dry-run|0|Would delete update 2016b
+head -c 3000000 /dev/zero >$state/tz/2016b/x; ln $state/tz/2016b/{x,y}; ctl cleanup --dry-run|0|update 2016b: 3.0 MB
+ln -sfn localtime $state/localtime; ctl cleanup --dry-run|0|Would delete update 2016b
 ctl cleanup|0|Deleted update 2016g|2016d/zoneinfo 2016d/icutz 2016f 2016d 2016f
 ln -sfn /var/db/timezone/tz/2016g/../2016d/icutz $state/icutz; ctl cleanup|0|2016b|2016d/zoneinfo 2016g/../2016d/icutz 2016f 2016d 2016f 2016g
 mv $state/tz/2016b root/; ln -s ../../../../2016b $state/tz/2016b; ctl cleanup && cat root/2016b/zoneinfo/Europe/Paris|0|TZif|2016d/zoneinfo 2016d/icutz 2016f 2016b 2016d 2016f
@@ -90,7 +94,21 @@ mv $state/tz root/; ln -s /tz $state/tz; ctl cleanup|1|a link perhaps
 exec {lock}<$state; flock $lock; ctl install 2016h|1|another tzctl is at work
 ctl status >/dev/full|1|standard output
 ctl --version >&-|1|standard output
-plain_and_narrow|0|fits
+in_order|0|fits
+coloured_lines NO_COLOR=|0|3
+coloured_lines NO_COLOR=1|1|0
+ctl|0|yes         yes   latest
+ln -sfn nowhere $state/zoneinfo; ctl|0|It will say
+rm $state/icutz; ctl|0|What is not as it should be
+touch $state/tz/note; mkdir $state/tz/.tzctl; told .installed[5]|0|null
+mv $state/tz/{2016g,9999999999a}; told '[.installed[4]["version", "newer_than_system"], .findings[0]]'|0|["9999999999a",false,"9999999999a: the version holds a number beyond 2147483647"]
+echo 9999999999a >root/usr/share/zoneinfo.default/+VERSION; told '[.system, .current.newer_than_system, .findings[0]]'|0|[null,false,"No start can use the system's own data"
+rm root/usr/share/zoneinfo.default/UTC; told .findings[]|0|There is no zone file in /usr/share/zoneinfo.default.
+rm $state/icutz $state/tz_latest; mkdir $state/icutz; ln -sfn nowhere $state/localtime; told '[.links[].state]'|0|["ok","not a link","missing","dangling"]
+touch $state/needs_cleanup; printf 2016c_2016d >$state/TZVersionDiffRecord; told '[.marker, .record]'|0|[true,"2016c_2016d"]
+ln -sfn nowhere $state/zoneinfo; told .findings[]|0|Bad zoneinfo link
+ln -sfn nowhere $state/tz_latest; told .findings[]|0|The latest link leads nowhere.
+ctl use system; ln -s x $state/icutz; told .findings[]|0|The ICU link has been left behind
 told '.installed[0].version + .installed[4].version + .system.version'|0|2016g2016b2016c.1.0
 ln -sfn "$(printf 'a\377b\033')" $state/localtime; told .links.localtime.target|0|a\xffb
 ln -sfn "$(printf 'a\377b\033')" $state/localtime; ctl|0|a\xffb\x1b
@@ -101,4 +119,5 @@ ctl use|2|VERSION
 "$tzctl" --root "" cleanup|2|--root
 ctl frobnicate|2|frobnicate
 ctl make update|2|takes no --root
+"$tzctl" make frobnicate|2|usage: make-dataset
 END

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #include <algorithm>
 #include <array>
+#include <cerrno>
 #include <cstdlib>
 #include <iomanip>
 #include <iostream>
@@ -46,6 +47,7 @@ ordered_json describe(const std::string& path, const kiv_dataset* system) {
         if (path.empty()) {
             return nullptr;
         }
+        errno = 0; // no call has failed
         warn("%s: the version holds a number beyond 2147483647", version.c_str());
     } catch (...) {
         return nullptr;
