@@ -99,6 +99,7 @@ coloured_lines NO_COLOR=|0|3
 coloured_lines NO_COLOR=1|1|0
 ctl|0|yes         yes   latest
 ln -sfn nowhere $state/zoneinfo; ctl|0|It will say
+rm -r $state/tz/*; echo 9999999999a >root/usr/share/zoneinfo.default/+VERSION; ctl|0|  icutz     -> /var
 rm $state/icutz; ctl|0|What is not as it should be
 touch $state/tz/note; mkdir $state/tz/.tzctl; told .installed[5]|0|null
 mv $state/tz/{2016g,9999999999a}; told '[.installed[4]["version", "newer_than_system"], .findings[0]]'|0|["9999999999a",false,"9999999999a: the version holds a number beyond 2147483647"]

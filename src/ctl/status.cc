@@ -233,7 +233,7 @@ void print_dataset(const ordered_json& dataset, const ordered_json& survey) {
 
 void print_link(const std::string& name, const ordered_json& link) {
     const std::string state = link["state"];
-    std::cout << "  " << std::setw(10) << name;
+    std::cout << std::left << "  " << std::setw(10) << name;
     if (link["target"].is_null()) {
         std::cout << state << '\n';
     } else {
