@@ -79,6 +79,9 @@ void declare(CLI::App& app, command_line& given) {
     };
     app.add_option("--root", given.root, "Work on the system image in this directory")
         ->check(not_empty);
+    app.failure_message([](const CLI::App* asked, const CLI::Error& error) {
+        return "tzctl: " + CLI::FailureMessage::simple(asked, error);
+    });
     app.require_subcommand(0, 1);
     app.fallthrough();
 
