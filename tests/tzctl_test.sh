@@ -19,7 +19,7 @@ dataset() { # DIRECTORY SCHEMA
 # The system at 2016c, update 2016d current, and others older, newer, incompatible and latest.
 lay_out() {
     chmod -R u+rwX root 2>/dev/null || true
-    rm -rf root 20*
+    rm -rf root 20* .2016h
     mkdir -p root/usr/share/{icu,zoneinfo.default} $state/tz
     echo 2016c >root/usr/share/zoneinfo.default/+VERSION
     printf TZif2 >root/usr/share/zoneinfo.default/UTC
@@ -56,12 +56,15 @@ while IFS='|' read -r commands status said after; do
 done <<'END'
 ctl install 2016h|0|adopts update 2016h|2016d/zoneinfo 2016d/icutz 2016h 2016b 2016d 2016e 2016f 2016g 2016h
 mkdir root/new; mv 2016h root/new; ctl install /new/2016h/|0|adopts|2016d/zoneinfo 2016d/icutz 2016h 2016b 2016d 2016e 2016f 2016g 2016h
+cp -r 2016h root; rm -r 2016h/zoneinfo; ctl install 2016h|1|holds no tz database
+mkdir -p root$PWD; cp -r 2016h root$PWD; rm -r 2016h/zoneinfo; ctl install $PWD/2016h|0|adopts|2016d/zoneinfo 2016d/icutz 2016h 2016b 2016d 2016e 2016f 2016g 2016h
 mkdir $state/tz/.tzctl; ctl install 2016h|0|adopts|2016d/zoneinfo 2016d/icutz 2016h 2016b 2016d 2016e 2016f 2016g 2016h
 mv 2016h 2016a; ctl install 2016a|1|2016a is not newer than 2016d
 mv 2016h 2016a; ctl install --force 2016a|0|keeps update 2016d|2016d/zoneinfo 2016d/icutz 2016a 2016a 2016b 2016d 2016e 2016f 2016g
 mv 2016h/icutz/icutz44{l,b}.dat; ctl install 2016h|1|2016h has ICU schema 44b, the system ICU schema 44l.
 rm -r 2016h/zoneinfo; ctl install 2016h|1|holds no tz database
 mv 2016h 2016H; ctl install 2016H|1|"2016H" is not a version
+mv 2016h .2016h; ctl install --force .2016h|1|".2016h" is not a version
 mv 2016h 20160000000h; ctl install 20160000000h|1|a number beyond 2147483647
 mv 2016h 2016g; ctl install 2016g|1|2016g is installed already
 mkfifo 2016h/zoneinfo/pipe; ctl install 2016h|1|pipe is neither a file
@@ -119,6 +122,7 @@ rm $state/tz/2016f/zoneinfo/Europe/Paris; told .findings[]|0|lacks the local zon
 ctl use|2|VERSION
 "$tzctl" --root "" cleanup|2|--root
 ctl frobnicate|2|frobnicate
+ctl status cleanup|2|cleanup
 ctl make update|2|takes no --root
 "$tzctl" make frobnicate|2|usage: make-dataset
 END
