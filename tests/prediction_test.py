@@ -132,9 +132,14 @@ def check(number):
     assert everything() == disk, "looking has changed the disk"
     foretold = json.loads(looked.stdout)["next_start"]
     assert foretold.pop("reason")
+    told = run("/tzctl").stdout.decode().partition("It will say")[2].partition("\n\n")[0]
     start = run("/tzreconcile")
-    happened = what_happened(before, start.returncode, start.stderr.decode(errors="replace"))
-    assert foretold == happened, f"{number}:\nforetold {foretold}\nhappened {happened}\n{start.stderr.decode()}"
+    said = start.stderr.decode().replace("tzreconcile: ", "")
+    happened = what_happened(before, start.returncode, said)
+    assert foretold == happened, f"{number}:\nforetold {foretold}\nhappened {happened}\n{said}"
+    for line in said.splitlines():
+        message = " ".join(line.rpartition(": ")[0].split())
+        assert message in " ".join(told.split()), f"{number}:\ntold {told}\nsaid {said}"
     return happened["decision"]
 
 

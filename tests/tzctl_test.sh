@@ -35,6 +35,7 @@ lay_out() {
 }
 
 ctl() { "$tzctl" --root root "$@"; }
+interrupted() { strace -qqo /dev/null -e inject="$1":signal=INT:when=1 "$tzctl" --root root "${@:2}"; } # AT VERB...
 in_order() { if ctl | grep -P '\x1b|.{81}|not as it should'; then return 1; fi; echo fits; }
 coloured_lines() { env "$@" script -qec "'$tzctl' --root root" /dev/null | grep -c $'\e'; }
 told() { ctl status --json | jq -cr "$1"; }
@@ -94,6 +95,8 @@ ln -sfn 2016g $state/tz/2016d; rm -r $state/tz/2016d/2016g; ln -sfn tz/2016d/../
 ln -sfn nowhere $state/zoneinfo; ctl cleanup|1|current link cannot be read
 rm $state/tz_latest; touch $state/tz_latest; ctl cleanup|1|tz_latest cannot be read
 mv $state/tz root/; ln -s /tz $state/tz; ctl cleanup|1|a link perhaps
+interrupted sendfile install 2016h|1|interrupted
+interrupted rename cleanup|1|interrupted|2016d/zoneinfo 2016d/icutz 2016f 2016d 2016e 2016f 2016g
 exec {lock}<$state; flock $lock; ctl install 2016h|1|another tzctl is at work
 ctl status >/dev/full|1|standard output
 ctl --version >&-|1|standard output
@@ -115,11 +118,12 @@ ln -sfn nowhere $state/tz_latest; told .findings[]|0|The latest link leads nowhe
 ctl use system; ln -s x $state/icutz; told .findings[]|0|The ICU link has been left behind
 told '.installed[0].version + .installed[4].version + .system.version'|0|2016g2016b2016c.1.0
 ln -sfn "$(printf 'a\377b\033')" $state/localtime; told .links.localtime.target|0|a\xffb
-ln -sfn "$(printf 'a\377b\033')" $state/localtime; ctl|0|a\xffb\x1b
+ln -sfn "$(printf 'a\377b\033\302\233\303\251')" $state/localtime; ctl|0|a\xffb\x1b\xc2\x9bé
 rm $state/icutz; told .findings[]|0|The ICU link does not lead into the current update
 ln -sfn /var/db/timezone/zoneinfo/Europe $state/localtime; told .findings[]|0|The local-time link leads to no zone file
 rm $state/tz/2016f/zoneinfo/Europe/Paris; told .findings[]|0|lacks the local zone
-ctl use|2|VERSION
+ctl --help|0|Delete the updates
+ctl use|2|tzctl: VERSION
 "$tzctl" --root "" cleanup|2|--root
 ctl frobnicate|2|frobnicate
 ctl status cleanup|2|cleanup
