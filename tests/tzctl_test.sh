@@ -35,7 +35,7 @@ lay_out() {
 }
 
 ctl() { "$tzctl" --root root "$@"; }
-interrupted() { strace -qqo /dev/null -e inject="$1":signal=INT:when=1 "$tzctl" --root root "${@:2}"; } # AT VERB...
+disturbed() { strace -qqo /dev/null -e inject="$1" "$tzctl" --root root "${@:2}"; } # HOW VERB...
 in_order() { if ctl | grep -P '\x1b|.{81}|not as it should'; then return 1; fi; echo fits; }
 coloured_lines() { env "$@" script -qec "'$tzctl' --root root" /dev/null | grep -c $'\e'; }
 told() { ctl status --json | jq -cr "$1"; }
@@ -92,11 +92,13 @@ ctl cleanup|0|Deleted update 2016g|2016d/zoneinfo 2016d/icutz 2016f 2016d 2016f
 ln -sfn /var/db/timezone/tz/2016g/../2016d/icutz $state/icutz; ctl cleanup|0|2016b|2016d/zoneinfo 2016g/../2016d/icutz 2016f 2016d 2016f 2016g
 mv $state/tz/2016b root/; ln -s ../../../../2016b $state/tz/2016b; ctl cleanup && cat root/2016b/zoneinfo/Europe/Paris|0|TZif|2016d/zoneinfo 2016d/icutz 2016f 2016b 2016d 2016f
 ln -sfn 2016g $state/tz/2016d; rm -r $state/tz/2016d/2016g; ln -sfn tz/2016d/../2016b $state/tz_latest; ctl cleanup|0|2016e|2016d/zoneinfo 2016d/icutz tz/2016d/../2016b 2016b 2016d
+ln -sfn $(printf %0300d 0) $state/localtime; ctl cleanup|1|File name too long
 ln -sfn nowhere $state/zoneinfo; ctl cleanup|1|current link cannot be read
 rm $state/tz_latest; touch $state/tz_latest; ctl cleanup|1|tz_latest cannot be read
 mv $state/tz root/; ln -s /tz $state/tz; ctl cleanup|1|a link perhaps
-interrupted sendfile install 2016h|1|interrupted
-interrupted rename cleanup|1|interrupted|2016d/zoneinfo 2016d/icutz 2016f 2016d 2016e 2016f 2016g
+disturbed sendfile:signal=INT install 2016h|1|interrupted
+disturbed rename:error=EIO:when=2 use 2016f|1|tz_latest: Input/output error
+disturbed rename:signal=INT cleanup|1|interrupted|2016d/zoneinfo 2016d/icutz 2016f 2016d 2016e 2016f 2016g
 exec {lock}<$state; flock $lock; ctl install 2016h|1|another tzctl is at work
 ctl status >/dev/full|1|standard output
 ctl --version >&-|1|standard output
