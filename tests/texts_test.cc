@@ -45,7 +45,8 @@ void compare_with_regular_expressions(const std::string& text) {
     const auto pieces = split_version(text);
     EXPECT_EQ(pieces ? shown(*pieces) : "",
               std::regex_match(text, match, version) ? match.format("$1 $2 $3 $4") : "");
-    for (const auto& name : {"icutz" + text + ".dat", text + "icutz4l.dat", "icutz4l.dat" + text}) {
+    for (const auto& name : {"icutz" + text + ".dat", text + "icutz4l.dat", "icutz4l.dat" + text,
+                             text + "tz4l.dat", "icutz4l" + text + "t"}) {
         const bool matches = std::regex_match(name, match, icu_name);
         EXPECT_EQ(icu_schema_in_name(name), matches ? match.str(1) : "") << name;
     }

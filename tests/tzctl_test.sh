@@ -106,6 +106,7 @@ in_order|0|fits
 coloured_lines NO_COLOR=|0|3
 coloured_lines NO_COLOR=1|1|0
 ctl|0|yes         yes   latest
+ctl|0|yes         no    may be removed
 ln -sfn nowhere $state/zoneinfo; ctl|0|It will say
 rm -r $state/tz/*; echo 9999999999a >root/usr/share/zoneinfo.default/+VERSION; ctl|0|  icutz     -> /var
 rm $state/icutz; ctl|0|What is not as it should be
@@ -114,7 +115,7 @@ mv $state/tz/{2016g,9999999999a}; told '[.installed[4]["version", "newer_than_sy
 echo 9999999999a >root/usr/share/zoneinfo.default/+VERSION; told '[.system, .current.newer_than_system, .findings[0]]'|0|[null,false,"No start can use the system's own data"
 rm root/usr/share/zoneinfo.default/UTC; told .findings[]|0|There is no zone file in /usr/share/zoneinfo.default.
 rm $state/icutz $state/tz_latest; mkdir $state/icutz; ln -sfn nowhere $state/localtime; told '[.links[].state]'|0|["ok","not a link","missing","dangling"]
-touch $state/needs_cleanup; printf 2016c_2016d >$state/TZVersionDiffRecord; told '[.marker, .record]'|0|[true,"2016c_2016d"]
+touch $state/needs_cleanup; printf 2016c_2016d >$state/TZVersionDiffRecord; told '[.format, .marker, .record]'|0|[1,true,"2016c_2016d"]
 ln -sfn nowhere $state/zoneinfo; told .findings[]|0|Bad zoneinfo link
 ln -sfn nowhere $state/tz_latest; told .findings[]|0|The latest link leads nowhere.
 ctl use system; ln -s x $state/icutz; told .findings[]|0|The ICU link has been left behind
