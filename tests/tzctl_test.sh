@@ -101,6 +101,7 @@ ln -sfn nowhere $state/zoneinfo; ctl cleanup|1|current link cannot be read
 rm $state/tz_latest; touch $state/tz_latest; ctl cleanup|1|tz_latest cannot be read
 mv $state/tz root/; ln -s /tz $state/tz; ctl cleanup|1|a link perhaps
 disturbed sendfile:signal=INT:when=1 install 2016h|1|interrupted
+disturbed rename:error=EIO:when=2 install 2016h|1|tz_latest: Input/output error
 disturbed rename:error=EIO:when=2 use 2016f|1|tz_latest: Input/output error
 disturbed rename:signal=INT:when=1 cleanup|1|interrupted|2016d/zoneinfo 2016d/icutz 2016f 2016d 2016e 2016f 2016g
 exec {lock}<$state; flock $lock; ctl install 2016h|1|another tzctl is at work
