@@ -14,6 +14,7 @@
 #include "ctl/verbs.h"
 #include "fs/layout.h"
 #include "platform/disk.h"
+#include "platform/failure.h"
 #include "platform/imagination.h"
 #include "version/data_version.h"
 
@@ -21,7 +22,6 @@ namespace tz {
 namespace {
 
 namespace files = std::filesystem;
-using updates::check;
 
 void check_name(const std::string& version, bool forced) {
     if (version.empty() || version[0] == '.' || !(forced || split_version(version))) {

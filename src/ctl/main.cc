@@ -12,9 +12,9 @@
 #include <unistd.h>
 
 #include "ctl/text.h"
-#include "ctl/updates.h"
 #include "ctl/verbs.h"
 #include "fs/descriptor.h"
+#include "platform/failure.h"
 #include "platform/process.h"
 #include "platform/root.h"
 
@@ -67,7 +67,7 @@ void install(const command_line& given) {
         tz::install(there, outside.filename(), given.forced);
     } else {
         const tz::fs::descriptor here(::open(inside.c_str(), O_DIRECTORY | O_CLOEXEC));
-        tz::updates::check(here.number(), given.dataset);
+        tz::check(here.number(), given.dataset);
         tz::install(here, inside.filename(), given.forced);
     }
 }

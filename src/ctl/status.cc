@@ -35,6 +35,12 @@ ordered_json word_or_null(const std::string& word) {
     return word.empty() ? ordered_json() : ordered_json(in_utf8(word));
 }
 
+// A warning like those of the shared code, but for no call that has failed.
+void note(const std::string& finding) {
+    errno = 0;
+    warn("%s", finding.c_str());
+}
+
 // A dataset, also one whose version a start cannot read; null if the path names none.
 ordered_json describe(const std::string& path, const kiv_dataset* system) {
     std::string version = files::path(path).filename();
@@ -47,8 +53,7 @@ ordered_json describe(const std::string& path, const kiv_dataset* system) {
         if (path.empty()) {
             return nullptr;
         }
-        errno = 0; // no call has failed
-        warn("%s: the version holds a number beyond 2147483647", version.c_str());
+        note(version + ": the version holds a number beyond 2147483647");
     } catch (...) {
         return nullptr;
     }
@@ -143,7 +148,7 @@ ordered_json survey(prediction& next_start) {
     try {
         system.emplace();
     } catch (...) {
-        warn("No start can use the system's own data");
+        note("No start can use the system's own data");
     }
     const kiv_dataset* const reference = system ? &*system : nullptr;
     const auto current = current_dataset_path();

@@ -5,7 +5,6 @@
 #include <cerrno>
 #include <csignal>
 #include <stdexcept>
-#include <system_error>
 
 #include <fcntl.h>
 #include <sys/file.h>
@@ -14,6 +13,7 @@
 
 #include "ctl/prediction.h"
 #include "fs/layout.h"
+#include "platform/failure.h"
 #include "platform/imagination.h"
 
 namespace tz::updates {
@@ -155,12 +155,6 @@ void replace(const links& wanted) {
         throw;
     }
     ::sync();
-}
-
-void check(int result, const std::string& what) {
-    if (result == -1) {
-        throw std::system_error(errno, std::generic_category(), what);
-    }
 }
 
 work::work()

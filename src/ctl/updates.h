@@ -42,9 +42,6 @@ using links = std::map<std::string, std::optional<std::string>, std::greater<>>;
 /// all are as before.
 void replace(const links& wanted);
 
-/// Throws what `errno` says of `what`, if `result` is -1.
-void check(int result, const std::string& what);
-
 /// As long as this lives, no other tzctl changes anything, no interruption ends this one before it
 /// has put things in order, and the working directory is that of the updates: it may belong to
 /// somebody who puts a link in its place meanwhile. Nothing half-made is there before or after.

@@ -1,21 +1,15 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #include "platform/root.h"
 
-#include <cerrno>
 #include <fstream>
-#include <system_error>
 
 #include <sched.h>
 #include <unistd.h>
 
+#include "platform/failure.h"
+
 namespace tz {
 namespace {
-
-void check(int result, const std::string& what) {
-    if (result == -1) {
-        throw std::system_error(errno, std::generic_category(), what);
-    }
-}
 
 void become_root_of_a_namespace() {
     const auto user = ::geteuid();
