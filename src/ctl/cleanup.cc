@@ -1,62 +1,93 @@
 // SPDX-License-Identifier: BSD-2-Clause
-#include <filesystem>
+#include <cstring>
 #include <iomanip>
 #include <iostream>
-#include <optional>
-#include <set>
-#include <utility>
 
-#include <sys/stat.h>
+#include <fcntl.h>
 
+#include "ctl/failure.h"
+#include "ctl/interruption.h"
+#include "ctl/root.h"
 #include "ctl/text.h"
+#include "ctl/tree.h"
 #include "ctl/updates.h"
 #include "ctl/verbs.h"
+#include "ctl/work.h"
+#include "rehearsal/kernel.h"
 
 namespace tz {
 namespace {
 
-namespace files = std::filesystem;
-
-// In MB: what the files in `directory` and below take, each of which may have several names.
-double size_of(const files::path& directory) {
-    double bytes = 0;
-    std::set<std::pair<dev_t, ino_t>> counted;
-    for (const auto& entry : files::recursive_directory_iterator(directory)) {
-        struct stat status {};
-        if (::lstat(entry.path().c_str(), &status) == 0 &&
-            counted.emplace(status.st_dev, status.st_ino).second) {
-            bytes += static_cast<double>(status.st_blocks) * 512;
-        }
-    }
-    return bytes / 1e6;
+void report(const std::string& path) {
+    std::cerr << "tzctl: " << printable(path) << ": "
+              << (errno == EXDEV ? "a mount point" : std::strerror(errno)) << '\n';
 }
 
-// Whoever looks finds all of it or nothing.
-void remove_update(const files::path& name) {
-    files::rename(name, updates::staging);
-    files::remove_all(updates::staging);
+double size_of(const fs::descriptor& updates, const std::string& version) {
+    const std::string shown = in_image(updates::path_of(version));
+    const fs::descriptor update(::openat(updates.number(), version.c_str(),
+                                         O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+    check(update.number(), shown);
+    return tree::size(update, shown);
+}
+
+// A reader finds all of the update or nothing.
+bool delete_update(const fs::descriptor& updates, const std::string& version) {
+    const std::string name = tree::temporary_name();
+    if (kernel::rename_to_free_name(updates.number(), version, name) == -1) {
+        report(in_image(updates::path_of(version)));
+        return false;
+    }
+    if (!tree::remove(updates.number(), name, in_image(updates::path_of(name)), report)) {
+        std::cerr << "tzctl: " << printable(in_image(updates::path_of(version)))
+                  << ": partly deleted, the rest is now in " << name << '\n';
+        return false;
+    }
+    return true;
+}
+
+// Deletes what can be deleted, and returns whether that is everything.
+bool delete_unused(const fs::descriptor& updates, bool rehearsed) {
+    constexpr double mega = 1e6;
+    double freed = 0;
+    bool complete = true;
+    const auto unused = updates::removable(updates);
+    std::cout << std::fixed << std::setprecision(1);
+    for (const auto& version : unused) {
+        interruption::check();
+        try {
+            const double size = size_of(updates, version);
+            if (!rehearsed && !delete_update(updates, version)) {
+                complete = false;
+                continue;
+            }
+            freed += size;
+            std::cout << (rehearsed ? "Would delete update " : "Deleted update ") << version << ": "
+                      << size / mega << " MB\n";
+        } catch (const std::system_error& error) {
+            std::cerr << "tzctl: " << printable(error.what()) << '\n';
+            complete = false;
+        }
+    }
+    if (unused.empty()) {
+        std::cout << "There is no update to delete.\n";
+    } else {
+        std::cout << (rehearsed ? "That would free " : "That frees ") << freed / mega << " MB.\n";
+    }
+    return complete;
 }
 
 } // namespace
 
-void clean_up(bool rehearsed) {
-    std::optional<updates::work> work;
-    if (!rehearsed) {
-        work.emplace();
+bool clean_up(bool rehearsed) {
+    if (rehearsed) {
+        const auto updates = updates::open_directory();
+        check(updates ? 0 : -1, in_image(updates::path_of("")));
+        return delete_unused(*updates, rehearsed);
     }
-    std::cout << std::fixed << std::setprecision(1);
-    double freed = 0;
-    for (const auto& directory : updates::removable()) {
-        updates::end_if_interrupted();
-        const double size = size_of(directory);
-        if (!rehearsed) {
-            remove_update(directory.filename());
-        }
-        std::cout << (rehearsed ? "Would delete update " : "Deleted update ")
-                  << printable(directory.filename()) << ": " << size << " MB\n";
-        freed += size;
-    }
-    std::cout << (rehearsed ? "That would give back " : "That gives back ") << freed << " MB.\n";
+    const work work;
+    finish_interrupted_use(work);
+    return delete_unused(work.updates(), rehearsed);
 }
 
 } // namespace tz

@@ -1,8 +1,10 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #include <cerrno>
 #include <csignal>
+#include <cstdlib>
 #include <filesystem>
 #include <iostream>
+#include <memory>
 #include <string>
 #include <system_error>
 #include <vector>
@@ -11,12 +13,15 @@
 #include <fcntl.h>
 #include <unistd.h>
 
+#include "ctl/failure.h"
+#include "ctl/interruption.h"
+#include "ctl/printers.h"
+#include "ctl/root.h"
 #include "ctl/text.h"
 #include "ctl/verbs.h"
 #include "fs/descriptor.h"
-#include "platform/failure.h"
 #include "platform/process.h"
-#include "platform/root.h"
+#include "rehearsal/regular_file.h"
 
 namespace {
 
@@ -31,19 +36,14 @@ struct command_line {
     bool rehearsed = false;
 };
 
-void enter_root_if_any(const std::string& root) {
-    if (!root.empty()) {
-        tz::enter_root(root);
-    }
-}
-
 // Becomes make-dataset, with these arguments.
 [[noreturn]] void make(std::vector<std::string> words) {
-    // Sought from where this program is, as a prefix may be chosen as late as at the installation.
+    // From where this program is, as a prefix may be chosen as late as at the installation. A build
+    // directory holds both.
     const auto here = files::read_symlink("/proc/self/exe").parent_path();
-    std::string program = here / MAKE_DATASET;
+    std::string program = here / "make-dataset";
     if (!files::exists(program)) {
-        program = here / "../../tools/make-dataset"; // in a checkout
+        program = here / MAKE_DATASET;
     }
     std::vector<char*> pointers{program.data()};
     for (auto& word : words) {
@@ -55,21 +55,23 @@ void enter_root_if_any(const std::string& root) {
     throw std::system_error(errno, std::generic_category(), program);
 }
 
-// A dataset is looked for where the command was given if its path is relative; and otherwise, or if
-// nothing is there, in the image first.
-void install(const command_line& given) {
-    std::error_code missing;
-    const files::path outside = files::canonical(given.dataset, missing);
-    const tz::fs::descriptor there(::open(outside.c_str(), O_DIRECTORY | O_CLOEXEC));
-    enter_root_if_any(given.root);
-    const files::path inside = files::canonical(given.dataset, missing);
-    if (there.is_open() && (missing || files::path(given.dataset).is_relative())) {
-        tz::install(there, outside.filename(), given.forced);
-    } else {
-        const tz::fs::descriptor here(::open(inside.c_str(), O_DIRECTORY | O_CLOEXEC));
-        tz::check(here.number(), given.dataset);
-        tz::install(here, inside.filename(), given.forced);
+void enter_root_if_any(const std::string& root) {
+    tz::prepare_to_open_regular_files();
+    if (!root.empty()) {
+        tz::enter_root(root);
     }
+}
+
+// The dataset is what the caller sees where the caller is, not in the image.
+void install(const command_line& given) {
+    const tz::fs::descriptor dataset(
+        ::open(given.dataset.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    tz::check(dataset.number(), given.dataset);
+    const std::unique_ptr<char, decltype(&std::free)> whole(
+        ::realpath(given.dataset.c_str(), nullptr), std::free);
+    tz::check(whole ? 0 : -1, given.dataset);
+    enter_root_if_any(given.root);
+    tz::install(dataset, given.dataset, files::path(whole.get()).filename(), given.forced);
 }
 
 void declare(CLI::App& app, command_line& given) {
@@ -79,13 +81,10 @@ void declare(CLI::App& app, command_line& given) {
     };
     app.add_option("--root", given.root, "Work on the system image in this directory")
         ->check(not_empty);
-    app.failure_message([](const CLI::App* asked, const CLI::Error& error) {
-        return "tzctl: " + CLI::FailureMessage::simple(asked, error);
-    });
     app.require_subcommand(0, 1);
     app.fallthrough();
 
-    app.add_subcommand("status", "Tell what is live and what the next start will do (default)")
+    app.add_subcommand("status", "Show what is current and what the next start will do (default)")
         ->add_flag("--json", given.json, "Print a JSON object, for programs");
     auto* const install = app.add_subcommand("install", "Install an update for the next start");
     install->add_option("DATASET", given.dataset, "Directory that tzctl make has made")
@@ -96,62 +95,73 @@ void declare(CLI::App& app, command_line& given) {
         ->add_option("VERSION", given.version, "Its version; \"system\" for the system's own data")
         ->required()
         ->check(not_empty);
-    app.add_subcommand("cleanup", "Delete the updates that are not in use")
-        ->add_flag("--dry-run", given.rehearsed, "Only say what would be deleted");
+    app.add_subcommand("cleanup", "Delete updates that no link in the state directory uses")
+        ->add_flag("--dry-run", given.rehearsed, "Only list what would be deleted");
     app.add_subcommand("make", "Make a dataset: see make-dataset(8)")
         ->prefix_command()
         ->fallthrough(false);
 }
 
-void run(const CLI::App& app, const command_line& given) {
+// The exit status.
+int run(const CLI::App& app, const command_line& given) {
     if (app.got_subcommand("make")) {
         if (!given.root.empty()) {
-            throw CLI::ValidationError("make", "writes where it is told to, and takes no --root");
+            throw CLI::ValidationError("make", "takes no --root");
         }
         make(app.get_subcommand("make")->remaining());
     }
     if (app.got_subcommand("install")) {
         install(given);
-        return;
+        return 0;
     }
     enter_root_if_any(given.root);
     if (app.got_subcommand("use")) {
         tz::use(given.version);
     } else if (app.got_subcommand("cleanup")) {
-        tz::clean_up(given.rehearsed);
+        return tz::clean_up(given.rehearsed) ? 0 : 1;
+    } else if (given.json) {
+        tz::print_as_json(tz::look());
     } else {
-        tz::print_status(given.json);
+        tz::print_for_people(tz::look());
     }
+    return 0;
 }
 
-// What was printed may still be lost.
-int finish(int status) {
-    if (!std::cout.flush()) {
-        std::cerr << "tzctl: cannot write to standard output\n";
-        return 1;
+int refuse_usage(const CLI::App& app, const CLI::ParseError& error) {
+    if (error.get_exit_code() == 0) { // it is the help or the version that was asked for
+        return app.exit(error);
     }
-    return status;
+    std::cerr << "tzctl: " << tz::printable(error.what())
+              << "\nRun \"tzctl --help\" for more information.\n";
+    return 2;
+}
+
+int parse_and_run(int count, char** words) {
+    CLI::App app("Shows which time-zone data is current and why, and manages updates.", "tzctl");
+    command_line given;
+    declare(app, given);
+    try {
+        app.parse(count, words);
+        return run(app, given);
+    } catch (const CLI::ParseError& error) {
+        return refuse_usage(app, error);
+    }
 }
 
 } // namespace
 
 int main(int count, char** words) {
     tz::platform::prepare_process();
+    int status = 1;
     try {
-        CLI::App app("Tells which time-zone data is live and why, and looks after updates.",
-                     "tzctl");
-        command_line given;
-        declare(app, given);
-        try {
-            app.parse(count, words);
-            run(app, given);
-            return finish(0);
-        } catch (const CLI::ParseError& error) {
-            return finish(app.exit(error) == 0 ? 0 : 2);
-        }
+        status = parse_and_run(count, words);
     } catch (const std::exception& error) {
-        std::cout.flush();
         std::cerr << "tzctl: " << tz::printable(error.what()) << '\n';
-        return 1;
     }
+    if (!std::cout.flush()) { // what was printed may still be lost
+        std::cerr << "tzctl: cannot write to standard output\n";
+        status = 1;
+    }
+    tz::interruption::end_process_if_any();
+    return status;
 }

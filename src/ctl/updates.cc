@@ -2,81 +2,79 @@
 #include "ctl/updates.h"
 
 #include <algorithm>
-#include <cerrno>
-#include <csignal>
-#include <stdexcept>
+#include <array>
+#include <climits>
+#include <set>
+#include <utility>
 
 #include <fcntl.h>
-#include <sys/file.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
-#include "ctl/prediction.h"
+#include "ctl/failure.h"
+#include "ctl/root.h"
+#include "ctl/tree.h"
 #include "fs/layout.h"
-#include "platform/failure.h"
-#include "platform/imagination.h"
+#include "startup/links.h"
+#include "version/data_version.h"
 
 namespace tz::updates {
 namespace {
 
-namespace files = std::filesystem;
+using identity = std::pair<dev_t, ino_t>;
 
-volatile std::sig_atomic_t asked_to_end = 0;
+constexpr char unknown_use[] = "names nothing, so nobody knows which updates are in use";
 
-// Beside a link: what it will be, and what it was.
-constexpr char wanted_suffix[] = ".tzctl-new";
-constexpr char former_suffix[] = ".tzctl-old";
+// Adds every entry on the way to `path`, which is absolute: directories, links, and what they lead
+// to, as far as that is there.
+void add_way_to(std::string path, std::set<identity>& passed) {
+    constexpr int most_links = 40; // that Linux follows
+    const std::string shown = in_image(path);
+    int links = 0;
+    fs::descriptor at(::open("/", O_PATH | O_CLOEXEC));
+    while (!path.empty() && links <= most_links) {
+        const auto slash = std::min(path.find('/'), path.size());
+        const std::string name = slash == 0 ? "." : path.substr(0, slash);
+        path.erase(0, slash + 1);
+        fs::descriptor next(::openat(at.number(), name.c_str(), O_PATH | O_NOFOLLOW | O_CLOEXEC));
+        if (!next.is_open() && is_missing()) {
+            return;
+        }
+        struct stat status {};
+        check(next.number(), shown);
+        check(::fstat(next.number(), &status), shown);
+        passed.emplace(status.st_dev, status.st_ino);
+        if (!S_ISLNK(status.st_mode)) {
+            at = std::move(next);
+            continue;
+        }
+        std::array<char, PATH_MAX> target{};
+        const ssize_t length = ::readlinkat(next.number(), "", target.data(), target.size());
+        check(length, shown);
+        path.insert(0, std::string(target.data(), static_cast<std::size_t>(length)) + "/");
+        ++links;
+        if (path.starts_with('/')) {
+            at = fs::descriptor(::open("/", O_PATH | O_CLOEXEC));
+        }
+    }
+}
 
-const files::path directory_of_updates = files::path(layout::updates_directory).parent_path();
-
-// All by which the links of the state directory lead. Throws if that cannot be told.
-std::vector<std::string> places_in_use() {
-    std::vector<std::string> places;
+std::set<identity> places_in_use() {
+    const auto current = target_of(layout::zoneinfo_link);
+    try {
+        (void)dataset_path_from_zoneinfo_link(current.value_or(""));
+    } catch (int) {
+        refuse(in_image(layout::zoneinfo_link), unknown_use);
+    }
+    if (exists(layout::latest_link) && !target_of(layout::latest_link)) {
+        refuse(in_image(layout::latest_link), unknown_use);
+    }
+    std::set<identity> places;
     for (const char* link :
          {layout::zoneinfo_link, layout::icu_link, layout::latest_link, layout::localtime_link}) {
-        if (target_of(link)) {
-            const auto way = imagination::way_to(link);
-            places.insert(places.end(), way.begin(), way.end());
-        } else if (errno == EINVAL ? link == layout::latest_link : errno != ENOENT) {
-            throw std::runtime_error(std::string(link) +
-                                     " cannot be read, so nothing is known to be unused");
-        }
+        add_way_to(link, places);
     }
     return places;
-}
-
-int open_directory(const std::string& path) {
-    const int directory = ::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
-    if (directory == -1 && errno == ENOTDIR) {
-        throw std::runtime_error(path + " is not a directory, but a link perhaps, through which "
-                                        "nothing is changed");
-    }
-    check(directory, path);
-    return directory;
-}
-
-void make_beside(const std::string& path, const char* suffix,
-                 const std::optional<std::string>& target) {
-    if (target) {
-        check(::symlink(target->c_str(), (path + suffix).c_str()), path);
-    }
-}
-
-// What lies beside takes the place of the link; if nothing does, the link goes. The result is as of
-// rename(2).
-int take_from_beside(const std::string& path, const char* suffix) {
-    const int result = ::rename((path + suffix).c_str(), path.c_str());
-    return result == -1 && errno == ENOENT ? ::unlink(path.c_str()) : result;
-}
-
-void delete_what_is_half_made() {
-    std::error_code none;
-    files::remove_all(staging, none);
-    for (const char* link : {layout::zoneinfo_link, layout::icu_link, layout::latest_link}) {
-        for (const char* suffix : {wanted_suffix, former_suffix}) {
-            files::remove(std::string(link) + suffix, none);
-        }
-    }
 }
 
 } // namespace
@@ -85,107 +83,61 @@ std::string path_of(const std::string& version) {
     return layout::updates_directory + version;
 }
 
-std::vector<files::path> installed() {
-    std::vector<files::path> found;
-    std::error_code none;
-    for (const auto& entry : files::directory_iterator(layout::updates_directory, none)) {
-        if (entry.is_directory(none) && entry.path().filename() != staging) {
-            found.push_back(entry.path());
-        }
-    }
-    std::sort(found.begin(), found.end());
-    return found;
-}
-
-std::vector<files::path> removable() {
-    imagination::forget();
-    if (!current_dataset_path()) {
-        throw std::runtime_error(
-            "the current link cannot be read, so nothing is known to be unused");
-    }
-    const fs::descriptor updates(open_directory(directory_of_updates)); // is one
-    auto found = installed();
-    const auto in_use = places_in_use();
-    std::erase_if(found, [&](const auto& directory) {
-        return files::is_symlink(directory) ||
-               std::any_of(in_use.begin(), in_use.end(), [&](const auto& place) {
-                   return (place + "/").starts_with(files::canonical(directory).string() + "/");
-               });
-    });
-    return found;
-}
-
-std::optional<std::string> first_bytes(const std::string& path, std::size_t most) {
-    const fs::descriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY));
-    struct stat status {};
-    if (!file.is_open() || ::fstat(file.number(), &status) == -1 || !S_ISREG(status.st_mode)) {
+std::optional<fs::descriptor> open_directory() {
+    fs::descriptor directory(::open(layout::updates_directory, O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    if (!directory.is_open() && is_missing()) {
         return std::nullopt;
     }
-    std::string text(most, '\0');
-    const auto length = ::read(file.number(), text.data(), text.size());
-    return length == -1 ? std::nullopt
-                        : std::optional(text.substr(0, static_cast<std::size_t>(length)));
+    check(directory.number(), in_image(layout::updates_directory));
+    return directory;
 }
 
-bool holds_zones(const std::string& directory) {
-    std::error_code failure;
-    for (files::recursive_directory_iterator at(directory, failure), end; !failure && at != end;
-         at.increment(failure)) {
-        if (first_bytes(at->path(), 4) == "TZif") {
-            return true;
+std::vector<std::string> installed(const fs::descriptor& directory) {
+    std::vector<std::string> versions;
+    const std::string shown = in_image(layout::updates_directory);
+    tree::for_each_name(directory, shown, [&](const std::string& name) {
+        struct stat status {};
+        if (!split_version(name)) {
+            return;
         }
-    }
-    return false;
-}
-
-void replace(const links& wanted) {
-    imagination::forget();
-    for (const auto& [path, target] : wanted) { // all that needs room
-        make_beside(path, wanted_suffix, target);
-        make_beside(path, former_suffix, target_of(path.c_str()));
-    }
-    try {
-        for (const auto& [path, target] : wanted) {
-            check(take_from_beside(path, wanted_suffix), path);
+        if (::fstatat(directory.number(), name.c_str(), &status, AT_SYMLINK_NOFOLLOW) == -1) {
+            return check(is_missing() ? 0 : -1, shown + name);
         }
-    } catch (...) {
-        for (const auto& [path, target] : wanted) {
-            (void)take_from_beside(path, former_suffix);
+        if (S_ISDIR(status.st_mode)) {
+            versions.push_back(name);
         }
-        throw;
-    }
-    ::sync();
+    });
+    std::sort(versions.begin(), versions.end());
+    return versions;
 }
 
-work::work()
-    : lock_(open_directory(layout::state_directory)),
-      updates_(open_directory(directory_of_updates)) {
-    for (const int signal : {SIGHUP, SIGINT, SIGTERM}) {
-        if (std::signal(signal, [](int) { asked_to_end = 1; }) == SIG_IGN) {
-            (void)std::signal(signal, SIG_IGN);
-        }
-    }
-    if (::flock(lock_.number(), LOCK_EX | LOCK_NB) == -1) {
-        check(-1, errno == EWOULDBLOCK ? "another tzctl is at work" : layout::state_directory);
-    }
-    return_to_updates();
-    delete_what_is_half_made();
+std::vector<std::string> removable(const fs::descriptor& directory) {
+    const auto in_use = places_in_use();
+    auto versions = installed(directory);
+    std::erase_if(versions, [&](const std::string& version) {
+        struct stat status {};
+        check(::fstatat(directory.number(), version.c_str(), &status, AT_SYMLINK_NOFOLLOW),
+              in_image(path_of(version)));
+        return in_use.contains({status.st_dev, status.st_ino});
+    });
+    return versions;
 }
 
-work::~work() {
-    if (::fchdir(updates_.number()) == 0) {
-        delete_what_is_half_made();
-    }
+bool exists(const std::string& path) {
+    struct stat status {};
+    const int result = ::lstat(path.c_str(), &status);
+    check(result == -1 && is_missing() ? 0 : result, in_image(path));
+    return result == 0;
 }
 
-void work::return_to_updates() const {
-    check(::fchdir(updates_.number()), directory_of_updates);
-}
-
-void end_if_interrupted() {
-    if (asked_to_end != 0) {
-        throw std::runtime_error("interrupted");
+std::optional<std::string> target_of(const std::string& link) {
+    std::array<char, PATH_MAX> target{};
+    const ssize_t length = ::readlink(link.c_str(), target.data(), target.size());
+    if (length == -1 && (is_missing() || errno == EINVAL)) {
+        return std::nullopt;
     }
+    check(length, in_image(link));
+    return std::string(target.data(), static_cast<std::size_t>(length));
 }
 
 } // namespace tz::updates

@@ -1,66 +1,35 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #pragma once
 
-#include <filesystem>
-#include <functional>
-#include <map>
 #include <optional>
 #include <string>
 #include <vector>
 
 #include "fs/descriptor.h"
 
-/// What the updater's verbs do to the disk, in earnest. Refusals and failures are thrown as
-/// std::exception, whose text is for people.
+/// The installed updates: the directories in the directory of updates that are named by a version.
+/// Everything else there is nobody's business here. All of this looks at the real disk, and throws
+/// std::exception if that fails.
 namespace tz::updates {
 
-/// The name that what is half-made or half-deleted has in the directory of updates.
-inline constexpr char staging[] = ".tzctl";
-
-/// The directory of the update of this version; the path of the system's own data is empty.
+/// The path of the update of this version.
 [[nodiscard]] std::string path_of(const std::string& version);
 
-/// The directories of the installed updates in the order of their names; a link to one counts, too.
-[[nodiscard]] std::vector<std::filesystem::path> installed();
+/// The directory of updates; nothing if there is none.
+[[nodiscard]] std::optional<fs::descriptor> open_directory();
 
-/// The installed updates by which no link of the state directory leads, and that are directories
-/// themselves. Throws while that cannot be told.
-[[nodiscard]] std::vector<std::filesystem::path> removable();
+/// The versions of the installed updates, in the order of their names.
+[[nodiscard]] std::vector<std::string> installed(const fs::descriptor& directory);
 
-/// The first bytes of the regular file at `path`, at most as many; nothing if there is none, or it
-/// cannot be read.
-[[nodiscard]] std::optional<std::string> first_bytes(const std::string& path, std::size_t most);
+/// The versions of the installed updates that are not in use: no link of the state directory leads
+/// to them or through them. Throws also while the current or the latest link names nothing, as then
+/// nobody knows what is in use.
+[[nodiscard]] std::vector<std::string> removable(const fs::descriptor& directory);
 
-/// Whether there is a compiled zone file in `directory` or below.
-[[nodiscard]] bool holds_zones(const std::string& directory);
+/// Whether there is an entry, of any type, at the path.
+[[nodiscard]] bool exists(const std::string& path);
 
-/// Links by their paths, with their targets; without one there is to be no link. The order is that
-/// in which they are replaced, with zoneinfo before icutz, as a start does.
-using links = std::map<std::string, std::optional<std::string>, std::greater<>>;
-
-/// Replaces each link in one step: nobody ever finds none where one was and will be. If that fails,
-/// all are as before.
-void replace(const links& wanted);
-
-/// As long as this lives, no other tzctl changes anything, no interruption ends this one before it
-/// has put things in order, and the working directory is that of the updates: it may belong to
-/// somebody who puts a link in its place meanwhile. Nothing half-made is there before or after.
-class work {
-  public:
-    work();
-    work(const work&) = delete;
-    work& operator=(const work&) = delete;
-    ~work();
-
-    /// Goes back to the directory of updates.
-    void return_to_updates() const;
-
-  private:
-    fs::descriptor lock_;
-    fs::descriptor updates_;
-};
-
-/// Throws if there was an interruption during the work.
-void end_if_interrupted();
+/// The target of a link; nothing if there is no link at the path.
+[[nodiscard]] std::optional<std::string> target_of(const std::string& link);
 
 } // namespace tz::updates

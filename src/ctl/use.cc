@@ -1,73 +1,109 @@
 // SPDX-License-Identifier: BSD-2-Clause
-#include <filesystem>
 #include <iostream>
 #include <optional>
-#include <stdexcept>
 
-#include "ctl/prediction.h"
+#include <fcntl.h>
+
+#include "ctl/failure.h"
+#include "ctl/root.h"
+#include "ctl/survey.h"
 #include "ctl/text.h"
+#include "ctl/tree.h"
 #include "ctl/updates.h"
 #include "ctl/verbs.h"
-#include "dataset/kiv_dataset.h"
+#include "ctl/work.h"
 #include "fs/layout.h"
-#include "fs/operations.h"
-#include "platform/imagination.h"
+#include "rehearsal/imagination.h"
 
 namespace tz {
 namespace {
 
-namespace files = std::filesystem;
-
-// The path of a dataset that is there.
-std::string checked_path(const std::string& version) {
+// The path of a dataset that is there, and has zones.
+std::string checked_path(const std::string& version, const work& work) {
+    constexpr int flags = O_RDONLY | O_DIRECTORY | O_CLOEXEC;
     const bool system = version == "system";
-    std::string path = system ? "" : updates::path_of(version);
-    if (!system && (version.empty() || version[0] == '.' ||
-                    files::path(version).filename() != version || !files::is_directory(path))) {
-        throw std::runtime_error("\"" + version + "\" is not installed");
+    if (!system &&
+        (version.empty() || version[0] == '.' || version.find('/') != std::string::npos ||
+         !fs::descriptor(::openat(work.updates().number(), version.c_str(), flags | O_NOFOLLOW))
+              .is_open())) {
+        refuse(version, "not installed");
     }
-    if (!updates::holds_zones(system ? layout::system_zoneinfo : path + layout::update_zoneinfo)) {
-        throw std::runtime_error(dataset_name(path) + " holds no tz database that can be read");
+    std::string path = system ? "" : updates::path_of(version);
+    const std::string zoneinfo = system ? layout::system_zoneinfo : path + layout::update_zoneinfo;
+    const fs::descriptor zones(::open(zoneinfo.c_str(), flags));
+    check(zones.is_open() || is_missing() ? 0 : -1, in_image(zoneinfo));
+    if (!zones.is_open() || !tree::holds_zones(zones, in_image(zoneinfo))) {
+        refuse(in_image(zoneinfo), "holds no zone file, so every time zone would be UTC");
     }
     return path;
 }
 
-// The links that are to be changed for the dataset at `path` to be current and the latest.
-updates::links imagine_use(const std::string& path) {
-    imagination::forget();
-    try {
-        kiv_dataset(path).make_current();
-        fs::remove(layout::latest_link);
-        if (!path.empty()) {
-            fs::create_symlink(path, layout::latest_link);
-        }
-    } catch (...) {
-        const auto said = imagination::take_warnings();
-        throw std::runtime_error(said.empty() ? "its version cannot be read" : said.back());
+// The links that make the dataset at `path` current and the latest, in the order of a start.
+std::vector<wanted_link> links_to(const std::string& path) {
+    if (path.empty()) {
+        return {{layout::zoneinfo_link, layout::system_zoneinfo},
+                {layout::icu_link, std::nullopt},
+                {layout::legacy_icu_link, std::nullopt},
+                {layout::latest_link, std::nullopt}};
     }
-    updates::links wanted;
-    for (const auto& [link, change] : imagination::noted()) {
-        const bool gone = change.what == imagination::entry::kind::nothing;
-        wanted[link] = gone ? std::nullopt : std::optional(change.target);
+    return {{layout::zoneinfo_link, path + layout::update_zoneinfo},
+            {layout::icu_link, path + layout::update_icu},
+            {layout::legacy_icu_link, std::nullopt},
+            {layout::latest_link, path}};
+}
+
+struct foresight {
+    candidates considered;
+    prediction start;
+};
+
+foresight foresee(const std::vector<wanted_link>& wanted) {
+    imagination::session imagined;
+    for (const auto& link : wanted) {
+        imagine(link);
     }
-    return wanted;
+    candidates considered = look_at_candidates();
+    return {std::move(considered), predict_start(imagined)};
+}
+
+foresight make_current(const std::string& version, const work& work) {
+    const std::string path = checked_path(version, work);
+    const auto wanted = links_to(path);
+    auto next = foresee(wanted);
+    const outcome& result = next.start.result;
+    const bool way_out = path.empty(); // also where no start goes well any more
+    if (result.dataset != path || (result.decided != decision::keep && !way_out)) {
+        refuse(version, "the next start would not keep it: " + reason(result, next.considered));
+    }
+    work.replace(wanted, version);
+    return next;
 }
 
 } // namespace
 
-void use(const std::string& version) {
-    const updates::work work;
-    const std::string path = checked_path(version);
-    const auto wanted = imagine_use(path);
-    const auto start = predict_start();
-    const bool way_out = path.empty(); // also where no start goes well any more
-    if (start.dataset != path || (start.decided != decision::keep && !way_out)) {
-        throw std::runtime_error("the next start would not keep it. " + start.reason);
+void finish_interrupted_use(const work& work) {
+    const auto version = unfinished_use();
+    if (!version) {
+        return;
     }
-    updates::replace(wanted);
-    std::cout << "Current now: " << printable(dataset_name(path)) << ".\n"
-              << wrapped("The next start " + headline(start) + ". " + start.reason)
-              << "Programs that run already keep what they have read.\n";
+    try {
+        (void)make_current(*version, work);
+    } catch (const std::exception& error) {
+        std::cerr << "tzctl: cannot complete \"use " << printable(*version)
+                  << "\": " << printable(error.what()) << '\n';
+    }
+    work.forget_unfinished_use();
+}
+
+void use(const std::string& version) {
+    const work work;
+    finish_interrupted_use(work);
+    const auto next = make_current(version, work);
+    const outcome& result = next.start.result;
+    std::cout << wrapped("Current now: " + dataset_name(result.dataset) + ".")
+              << wrapped("The next start " + headline(result) + ". " +
+                         reason(result, next.considered))
+              << "Running programs keep what they have read.\n";
 }
 
 } // namespace tz

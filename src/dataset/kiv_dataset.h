@@ -27,6 +27,11 @@ class kiv_dataset {
     /// of updates in its path.
     [[nodiscard]] std::string version_string() const { return version_string_; }
 
+    [[nodiscard]] const data_version& version() const { return version_; }
+
+    /// The schema of the ICU data; empty if none was found.
+    [[nodiscard]] const std::string& schema() const;
+
     /// Whether each component finds its counterpart in `other` compatible.
     [[nodiscard]] bool compatible_with(const kiv_dataset& other) const;
 

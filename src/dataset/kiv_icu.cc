@@ -36,7 +36,7 @@ std::string first_schema_in(std::string directory) {
              std::strerror(errno));
         throw int{errno};
     }
-    while (FTSENT* entry = ::fts_read(walk.get())) {
+    while (FTSENT* entry = platform::fts_read(walk.get())) {
         if (entry->fts_level != 1) {
             continue;
         }

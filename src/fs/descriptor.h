@@ -13,13 +13,22 @@ class descriptor {
     explicit descriptor(int number) : number_(number) {}
     descriptor(const descriptor&) = delete;
     descriptor& operator=(const descriptor&) = delete;
+    descriptor(descriptor&& other) noexcept : number_(other.release()) {}
+    descriptor& operator=(descriptor&& other) noexcept {
+        close();
+        number_ = other.release();
+        return *this;
+    }
     ~descriptor() { close(); }
 
     [[nodiscard]] int number() const { return number_; }
     [[nodiscard]] bool is_open() const { return number_ != -1; }
 
     /// Closes early, for those who want to know how it went: close(2)'s result; 0 if not open.
-    int close() { return is_open() ? ::close(std::exchange(number_, -1)) : 0; }
+    int close() { return is_open() ? ::close(release()) : 0; }
+
+    /// Hands the descriptor over to the caller.
+    [[nodiscard]] int release() { return std::exchange(number_, -1); }
 
   private:
     int number_;

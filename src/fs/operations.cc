@@ -69,14 +69,15 @@ std::string read_word(const std::string& path) {
     const descriptor file(
         platform::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY));
     struct stat status {};
-    if (!file.is_open() || ::fstat(file.number(), &status) == -1 || !S_ISREG(status.st_mode)) {
+    if (!file.is_open() || platform::fstat(file.number(), &status) == -1 ||
+        !S_ISREG(status.st_mode)) {
         return {};
     }
 
     std::string word;
     std::array<char, 4096> buffer; // NOLINT(*-member-init): read fills it
     for (;;) {
-        const ssize_t length = ::read(file.number(), buffer.data(), buffer.size());
+        const ssize_t length = platform::read(file.number(), buffer.data(), buffer.size());
         if (length == -1) {
             return {};
         }

@@ -32,8 +32,20 @@ int open(const char* path, int flags, mode_t mode) {
     return ::open(path, flags, mode);
 }
 
+int fstat(int descriptor, struct stat* status) {
+    return ::fstat(descriptor, status);
+}
+
+ssize_t read(int descriptor, void* buffer, std::size_t size) {
+    return ::read(descriptor, buffer, size);
+}
+
 FTS* fts_open(char* const* roots, int options) {
     return ::fts_open(roots, options, nullptr);
+}
+
+FTSENT* fts_read(FTS* walk) {
+    return ::fts_read(walk);
 }
 
 } // namespace tz::platform

@@ -4,6 +4,7 @@
 #include <cstddef>
 
 #include <fts.h>
+#include <sys/stat.h>
 #include <sys/types.h>
 
 // Or a start would fail on files beyond 2 GiB, and on any that is written after January 2038.
@@ -13,8 +14,8 @@ static_assert(sizeof(off_t) == 8 && sizeof(ino_t) == 8 && sizeof(time_t) == 8,
 /// The few calls with which a start looks at the disk and changes it. Each is the call of the C
 /// library that it is named after: arguments, results and `errno` are the same.
 ///
-/// They exist twice, and the linker picks: in disk.cc for the program that starts machines; and as
-/// an imagination in tzctl, which thus foretells a start by letting it run.
+/// They exist twice, and the linker picks: in disk.cc for the program that starts machines, and in
+/// tzctl as a simulation (rehearsal/imagination.h), with which it predicts a start by running it.
 namespace tz::platform {
 
 int access(const char* path, int mode);
@@ -23,6 +24,9 @@ int symlink(const char* target, const char* link_path);
 int unlink(const char* path);
 int remove(const char* path);
 int open(const char* path, int flags, mode_t mode = 0);
+int fstat(int descriptor, struct stat* status);
+ssize_t read(int descriptor, void* buffer, std::size_t size);
 FTS* fts_open(char* const* roots, int options);
+FTSENT* fts_read(FTS* walk);
 
 } // namespace tz::platform

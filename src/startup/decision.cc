@@ -3,13 +3,19 @@
 
 namespace tz {
 
-bool keep_current(const kiv_dataset& current, const kiv_dataset& system) {
-    return current.compatible_with(system) && !(system > current);
+verdict judge_current(const kiv_dataset& current, const kiv_dataset& system) {
+    if (!current.compatible_with(system)) {
+        return verdict::other_schema;
+    }
+    return system > current ? verdict::not_newer : verdict::fits;
 }
 
-bool adopt_latest(const kiv_dataset& latest, const kiv_dataset& current,
-                  const kiv_dataset& system) {
-    return latest.compatible_with(system) && latest > current;
+verdict judge_latest(const kiv_dataset& latest, const kiv_dataset& current,
+                     const kiv_dataset& system) {
+    if (!latest.compatible_with(system)) {
+        return verdict::other_schema;
+    }
+    return latest > current ? verdict::fits : verdict::not_newer;
 }
 
 } // namespace tz

@@ -6,10 +6,10 @@
 int main() {
     tz::platform::prepare_process();
     try {
-        tz::start_up();
+        (void)tz::start_up();
         return 0;
     } catch (...) {
-        tz::warn(tz::messages::gave_up);
+        tz::warn(tz::gave_up);
         return 1;
     }
 }

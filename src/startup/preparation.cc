@@ -3,11 +3,9 @@
 
 #include "fs/layout.h"
 #include "fs/operations.h"
-#include "platform/disk.h"
 #include "platform/warn.h"
 
 namespace tz {
-namespace {
 
 void prepare_state_directories() {
     fs::set_protection_class(layout::state_directory);
@@ -29,15 +27,6 @@ void migrate_legacy_icu_link() {
             warn("Could not remove %s", layout::legacy_icu_link);
         }
     }
-}
-
-} // namespace
-
-void prepare() {
-    prepare_state_directories();
-    migrate_legacy_icu_link();
-    (void)platform::remove(layout::cleanup_marker);
-    (void)platform::remove(layout::legacy_icu_directory);
 }
 
 } // namespace tz

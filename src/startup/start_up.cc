@@ -4,8 +4,9 @@
 #include <string>
 
 #include "dataset/kiv_dataset.h"
+#include "fs/layout.h"
+#include "platform/disk.h"
 #include "platform/warn.h"
-#include "startup/decision.h"
 #include "startup/links.h"
 #include "startup/localtime_link.h"
 #include "startup/preparation.h"
@@ -14,18 +15,20 @@
 namespace tz {
 namespace {
 
-std::string current_dataset_path_or_reset() {
+std::string current_dataset_path_or_reset(outcome& so_far) {
     try {
         return read_current_dataset_path();
     } catch (...) {
-        warn(messages::invalid_links);
+        so_far.decided = decision::reset;
+        so_far.current = verdict::none;
+        warn("Invalid current symlinks; resetting to system partition");
         reset_to_system_partition();
         return {};
     }
 }
 
 void drop_current() {
-    warn(messages::dropped);
+    warn("Symlink points at data incompatible with installed system");
     reset_to_system_partition();
     touch_needs_cleanup();
 }
@@ -38,13 +41,24 @@ void adopt(const kiv_dataset& latest, const kiv_dataset& effective, const kiv_da
     write_version_diff_record(effective, latest);
 }
 
-void reconcile() {
+// Each verdict is `failed` until it is known, as it then stays if an exception ends the sequence.
+void reconcile(outcome& so_far) {
     const kiv_dataset system;
+    so_far.latest = verdict::failed;
     const std::string latest_path = read_latest_link();
-    const kiv_dataset current(current_dataset_path_or_reset());
+    so_far.latest = latest_path.empty() ? verdict::none : verdict::unknown;
+    so_far.current = verdict::failed;
+    so_far.dataset = current_dataset_path_or_reset(so_far);
+    const kiv_dataset current(so_far.dataset);
 
-    const bool kept = keep_current(current, system);
+    const verdict found = judge_current(current, system);
+    const bool kept = found == verdict::fits;
+    if (so_far.current != verdict::none) {
+        so_far.current = found;
+    }
     if (!kept) {
+        so_far.decided = decision::drop;
+        so_far.dataset.clear();
         drop_current();
     }
     const kiv_dataset& effective = kept ? current : system;
@@ -52,8 +66,12 @@ void reconcile() {
         return;
     }
 
+    so_far.latest = verdict::failed;
     const kiv_dataset latest(latest_path);
-    if (adopt_latest(latest, current, system)) {
+    so_far.latest = judge_latest(latest, current, system);
+    if (so_far.latest == verdict::fits) {
+        so_far.decided = decision::adopt;
+        so_far.dataset = latest_path;
         adopt(latest, effective, system);
     } else {
         warn("New update not compatible or older version: %s vs. %s",
@@ -63,15 +81,22 @@ void reconcile() {
 
 } // namespace
 
-void start_up() {
-    prepare();
+outcome start_up() {
+    outcome result;
+    prepare_state_directories();
+    migrate_legacy_icu_link();
+    (void)platform::remove(layout::cleanup_marker);
+    (void)platform::remove(layout::legacy_icu_directory);
     try {
-        reconcile();
+        reconcile(result);
     } catch (...) {
-        warn(messages::fell_back);
+        warn("Unable to locate data; resetting to system partition");
         reset_to_system_partition();
+        result.decided = decision::reset;
+        result.dataset.clear();
     }
     repair_localtime_link();
+    return result;
 }
 
 } // namespace tz

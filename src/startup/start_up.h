@@ -1,19 +1,26 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #pragma once
 
+#include <string>
+
+#include "startup/decision.h"
+
 namespace tz {
 
-/// The warning lines that tell why a start goes back to the system's own data, or fails even so.
-namespace messages {
-inline constexpr char invalid_links[] = "Invalid current symlinks; resetting to system partition";
-inline constexpr char dropped[] = "Symlink points at data incompatible with installed system";
-inline constexpr char fell_back[] = "Unable to locate data; resetting to system partition";
-inline constexpr char gave_up[] = "Could not set all time-zone links"; // said by main
-} // namespace messages
+/// What one start decided, and why.
+struct outcome {
+    decision decided = decision::keep;
+    std::string dataset;                // path of the dataset now current; empty: the system's own
+    verdict current = verdict::unknown; // on the dataset that the current link named
+    verdict latest = verdict::unknown;  // on the dataset that the latest link names
+};
+
+/// The warning line with which main reports that start_up threw.
+inline constexpr char gave_up[] = "Could not set all time-zone links";
 
 /// One start: decides which time-zone data is current and makes the links say so. Every failure on
 /// the way ends with the system's own data being current. Throws only if that, or the link to the
 /// default zone after it, could not be done either; a warning line has then said why.
-void start_up();
+outcome start_up();
 
 } // namespace tz

@@ -19,7 +19,8 @@ void touch_needs_cleanup() {
     fs::descriptor marker(platform::open_dprotected_np(
         layout::cleanup_marker, O_RDWR | O_CREAT, platform::class_without_protection, 0, 0666));
     struct stat status {};
-    if (!marker.is_open() || ::fstat(marker.number(), &status) == -1 || marker.close() == -1) {
+    if (!marker.is_open() || platform::fstat(marker.number(), &status) == -1 ||
+        marker.close() == -1) {
         warn("Cannot touch file %s", layout::cleanup_marker);
     }
 }

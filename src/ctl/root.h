@@ -10,4 +10,7 @@ namespace tz {
 /// it in a user namespace. Throws std::system_error.
 void enter_root(const std::string& directory);
 
+/// `path`, which is absolute, as the caller types it: with the image in front.
+[[nodiscard]] std::string in_image(const std::string& path);
+
 } // namespace tz

@@ -1,15 +1,17 @@
 // SPDX-License-Identifier: BSD-2-Clause
-#include "platform/root.h"
+#include "ctl/root.h"
 
 #include <fstream>
 
 #include <sched.h>
 #include <unistd.h>
 
-#include "platform/failure.h"
+#include "ctl/failure.h"
 
 namespace tz {
 namespace {
+
+std::string image; // empty for the running system
 
 void become_root_of_a_namespace() {
     const auto user = ::geteuid();
@@ -28,6 +30,11 @@ void enter_root(const std::string& directory) {
     }
     check(::chroot(directory.c_str()), directory);
     check(::chdir("/"), directory);
+    image = directory.substr(0, directory.find_last_not_of('/') + 1);
+}
+
+std::string in_image(const std::string& path) {
+    return image + path;
 }
 
 } // namespace tz

@@ -1,0 +1,222 @@
+// SPDX-License-Identifier: BSD-2-Clause
+#include "ctl/survey.h"
+
+#include <algorithm>
+#include <array>
+#include <set>
+#include <stdexcept>
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include "ctl/failure.h"
+#include "ctl/root.h"
+#include "ctl/tree.h"
+#include "ctl/updates.h"
+#include "ctl/work.h"
+#include "dataset/kiv_dataset.h"
+#include "fs/layout.h"
+#include "rehearsal/regular_file.h"
+#include "startup/links.h"
+
+namespace tz {
+namespace {
+
+// The beginning of a regular file; nothing if there is none.
+std::optional<std::string> beginning_of(int directory, const std::string& path) {
+    std::array<char, 4096> text{};
+    const fs::descriptor file = open_regular_file(directory, path);
+    if (!file.is_open() && is_missing()) {
+        return std::nullopt;
+    }
+    check(file.number(), in_image(path));
+    const ssize_t length = ::read(file.number(), text.data(), text.size());
+    check(length, in_image(path));
+    return std::string(text.data(), static_cast<std::size_t>(length));
+}
+
+// Unlike a start's own way to the word, this one leads out of no update, since the word is printed.
+std::string release_of(const std::string& version) {
+    constexpr char white_space[] = " \t\n\v\f\r";
+    const auto updates = updates::open_directory();
+    const std::string path = version + layout::update_zoneinfo;
+    const std::string shown = in_image(updates::path_of(path));
+    const auto directory =
+        updates ? tree::open_directory(updates->number(), path, shown) : std::nullopt;
+    const std::string text =
+        directory
+            ? beginning_of(directory->number(), layout::zoneinfo_version_file + 1).value_or("")
+            : "";
+    const auto begin = std::min(text.find_first_not_of(white_space), text.size());
+    return text.substr(begin, text.find_first_of(white_space, begin) - begin);
+}
+
+std::optional<kiv_dataset> system_data() {
+    try {
+        return kiv_dataset();
+    } catch (const std::out_of_range&) {
+        return std::nullopt;
+    }
+}
+
+// Nothing if the path names no dataset.
+std::optional<dataset> describe(const std::string& path, const std::optional<kiv_dataset>& system) {
+    dataset found;
+    found.path = path;
+    try {
+        const kiv_dataset data(path);
+        found.version = data.version_string();
+        found.order = data.version();
+        found.schema = data.schema();
+        found.compatible = system && data.compatible_with(*system);
+        found.newer_than_system = system && data > *system;
+    } catch (const std::out_of_range&) {
+        found.version = path.substr(std::min(path.size(), updates::path_of("").size()));
+        found.readable = false;
+    } catch (...) {
+        return std::nullopt;
+    }
+    found.release = path.empty() ? found.version.substr(0, found.version.rfind(".1.0"))
+                                 : release_of(found.version);
+    return found;
+}
+
+std::vector<dataset> describe_installed() {
+    std::vector<dataset> all;
+    const auto directory = updates::open_directory();
+    if (!directory) {
+        return all;
+    }
+    std::vector<std::string> unused;
+    try {
+        unused = updates::removable(*directory);
+    } catch (const std::system_error&) {
+        throw;
+    } catch (const std::runtime_error&) {
+        // None can be called unused then; the links are among the findings.
+    }
+    const auto system = system_data();
+    for (const auto& version : updates::installed(*directory)) {
+        auto data = describe(updates::path_of(version), system);
+        if (data) {
+            data->removable = std::binary_search(unused.begin(), unused.end(), version);
+            all.push_back(*std::move(data));
+        }
+    }
+    std::sort(all.begin(), all.end(), [](const dataset& left, const dataset& right) {
+        return left.order == right.order ? left.version < right.version : left.order > right.order;
+    });
+    return all;
+}
+
+// Whether the path, links followed, leads to something.
+bool leads_to_something(const char* path) {
+    const fs::descriptor there(::open(path, O_PATH | O_CLOEXEC));
+    const bool nowhere =
+        !there.is_open() && (is_missing() || errno == ELOOP || errno == ENAMETOOLONG);
+    check(there.is_open() || nowhere ? 0 : -1, in_image(path));
+    return there.is_open();
+}
+
+bool is_regular_file(const char* path) {
+    struct stat status {};
+    return leads_to_something(path) && ::stat(path, &status) == 0 && S_ISREG(status.st_mode);
+}
+
+link describe_link(const char* path) {
+    const auto target = updates::target_of(path);
+    if (target) {
+        return {path, target, leads_to_something(path) ? link_state::ok : link_state::dangling};
+    }
+    return {path, target, updates::exists(path) ? link_state::not_a_link : link_state::missing};
+}
+
+bool holds_zones(const std::string& zoneinfo) {
+    const fs::descriptor directory(::open(zoneinfo.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    check(directory.is_open() || is_missing() || errno == ELOOP ? 0 : -1, in_image(zoneinfo));
+    return directory.is_open() && tree::holds_zones(directory, in_image(zoneinfo));
+}
+
+// What is wrong, beside the warning lines that looking at it has given.
+std::vector<std::string> problems_in(const survey& found) {
+    std::vector<std::string> all;
+    const auto add = [&](bool holds, const std::string& problem) {
+        if (holds) {
+            all.push_back(problem);
+        }
+    };
+    for (const auto& data : found.installed) {
+        add(!data.readable, data.version + ": the version holds a number beyond 2147483647");
+    }
+    const auto& current = found.linked.current;
+    const bool update = current && !current->path.empty();
+    add(!found.linked.system, "No start can use the system's own data.");
+    add(!holds_zones(layout::system_zoneinfo),
+        std::string("There is no zone file in ") + layout::system_zoneinfo + ".");
+    add(update && !holds_zones(current->path + layout::update_zoneinfo),
+        "The current update holds no zone file: every time zone is UTC.");
+    add(update && found.icutz.target != current->path + layout::update_icu,
+        "The ICU link does not lead into the current update: \"tzctl use\" corrects that.");
+    add(current && !update && found.icutz.state != link_state::missing,
+        "The ICU link is left over, as the system's own data is current: \"tzctl use system\" "
+        "corrects that.");
+    add(found.tz_latest.state == link_state::dangling, "The latest link leads nowhere.");
+    add(found.localtime.state != link_state::missing && !is_regular_file(layout::localtime_link),
+        "The local-time link leads to no zone file: local time is UTC.");
+    add(found.localtime.state == link_state::ok && !found.next_start.has_local_time,
+        "The next start makes data current that lacks the local zone.");
+    if (const auto version = unfinished_use()) {
+        add(true, "\"tzctl use " + *version +
+                      "\" was interrupted: the next tzctl that changes "
+                      "something completes it.");
+    }
+    return all;
+}
+
+} // namespace
+
+candidates look_at_candidates() {
+    const auto path_or_none = [](std::string (*read)()) -> std::optional<std::string> {
+        try {
+            return read();
+        } catch (int) {
+            return std::nullopt;
+        }
+    };
+    const auto system = system_data();
+    const auto current = path_or_none(read_current_dataset_path);
+    const auto latest = path_or_none(read_latest_link);
+    return {system ? describe("", system) : std::nullopt,
+            current ? describe(*current, system) : std::nullopt,
+            latest && !latest->empty() ? describe(*latest, system) : std::nullopt};
+}
+
+survey look() {
+    survey found;
+    {
+        imagination::session as_it_is;
+        found.linked = look_at_candidates();
+        found.installed = describe_installed();
+        found.findings = as_it_is.take_warnings();
+        as_it_is.check();
+    }
+    found.zoneinfo = describe_link(layout::zoneinfo_link);
+    found.icutz = describe_link(layout::icu_link);
+    found.tz_latest = describe_link(layout::latest_link);
+    found.localtime = describe_link(layout::localtime_link);
+    found.marker = leads_to_something(layout::cleanup_marker);
+    found.record = beginning_of(AT_FDCWD, layout::version_diff_record);
+    {
+        imagination::session imagined;
+        found.next_start = predict_start(imagined);
+    }
+    std::set<std::string> known;
+    const auto problems = problems_in(found);
+    found.findings.insert(found.findings.end(), problems.begin(), problems.end());
+    std::erase_if(found.findings,
+                  [&](const std::string& finding) { return !known.insert(finding).second; });
+    return found;
+}
+
+} // namespace tz

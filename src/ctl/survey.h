@@ -1,0 +1,61 @@
+// SPDX-License-Identifier: BSD-2-Clause
+#pragma once
+
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "rehearsal/prediction.h"
+#include "version/data_version.h"
+
+/// What tzctl knows of a system, as values: texts have the bytes that are on the disk.
+namespace tz {
+
+struct dataset {
+    std::string path;        // empty for the system's own data
+    std::string version;     // such as 2016b.1.0
+    std::string release;     // the word in "+VERSION", or empty
+    std::string schema;      // of the ICU data, or empty
+    data_version order;      // of the version
+    bool readable = true;    // by a start, which cannot read a number beyond INT_MAX
+    bool compatible = false; // with the system's ICU library
+    bool newer_than_system = false;
+    bool removable = false; // an update that is not in use
+};
+
+/// The datasets between which a start decides, as far as they exist.
+struct candidates {
+    std::optional<dataset> system;
+    std::optional<dataset> current;
+    std::optional<dataset> latest;
+};
+
+enum class link_state { ok, dangling, missing, not_a_link };
+
+struct link {
+    std::string path;
+    std::optional<std::string> target;
+    link_state state = link_state::missing;
+};
+
+struct survey {
+    candidates linked;
+    std::vector<dataset> installed; // newest first
+    link zoneinfo;
+    link icutz;
+    link tz_latest;
+    link localtime;
+    bool marker = false; // an update may be removed
+    std::optional<std::string> record;
+    prediction next_start;
+    std::vector<std::string> findings; // warning lines and sentences
+};
+
+/// Looks at everything, and changes nothing. Throws std::exception if something cannot be looked
+/// at, so what is found missing is missing.
+[[nodiscard]] survey look();
+
+/// What the current and the latest link name now, in the imagination.
+[[nodiscard]] candidates look_at_candidates();
+
+} // namespace tz

@@ -1,0 +1,55 @@
+// SPDX-License-Identifier: BSD-2-Clause
+#pragma once
+
+#include <functional>
+#include <optional>
+#include <string>
+
+#include "fs/descriptor.h"
+
+/// Work on whole directories of which somebody else may be the owner, and may change them at the
+/// same time. Every step goes from a directory's descriptor to an entry of it, follows no symbolic
+/// link, and opens only regular files. `shown` is what messages call the directory. Failures are
+/// thrown as std::exception, also when something is not what it was a moment before.
+namespace tz::tree {
+
+/// Opens the directory at `path` beneath the open `directory`, through no symbolic link. Nothing if
+/// there is none; a link counts as none.
+[[nodiscard]] std::optional<fs::descriptor> open_directory(int directory, const std::string& path,
+                                                           const std::string& shown);
+
+/// Calls `act` with the name of every entry of the open `directory`.
+void for_each_name(const fs::descriptor& directory, const std::string& shown,
+                   const std::function<void(const std::string&)>& act);
+
+/// Copies everything below `source` into the empty directory `copy`, which only this user may
+/// change, with modes that let everybody read it. Refuses what cannot be part of a dataset: special
+/// files, files that only somebody else than the owner of `source` may read, more than 8 levels of
+/// directories, symbolic links that lead out of the directory or nowhere, and what changes during
+/// the copy.
+void copy(const fs::descriptor& source, const fs::descriptor& copy, const std::string& shown);
+
+/// Whether both directories hold the same, byte for byte; owners, modes and times do not count.
+[[nodiscard]] bool equal(const fs::descriptor& one, const fs::descriptor& other,
+                         const std::string& shown);
+
+/// Whether `zoneinfo` has a compiled zone file, other than in posix/ and right/: there no program
+/// looks for a zone.
+[[nodiscard]] bool holds_zones(const fs::descriptor& zoneinfo, const std::string& shown);
+
+/// The number of bytes on the disk that removing everything below `directory` frees.
+[[nodiscard]] double size(const fs::descriptor& directory, const std::string& shown);
+
+/// Removes the entry `name` of `directory`, and everything below it on the same file system,
+/// however deep. Reports by `failed`, with a path that begins with `shown`, what could not be
+/// removed, with `errno` set, and goes on. Returns whether the entry is gone.
+bool remove(int directory, const std::string& name, const std::string& shown,
+            const std::function<void(const std::string&)>& failed);
+
+/// How the name of everything that is half-made or half-deleted begins.
+inline constexpr char half_made[] = ".tzctl.";
+
+/// A name that nobody can foresee: the prefix and 8 hexadecimal digits.
+[[nodiscard]] std::string temporary_name(const std::string& prefix = half_made);
+
+} // namespace tz::tree

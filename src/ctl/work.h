@@ -1,0 +1,55 @@
+// SPDX-License-Identifier: BSD-2-Clause
+#pragma once
+
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "fs/descriptor.h"
+
+namespace tz {
+
+/// What replacing one link needs: its path, and its new target, if it is to have one.
+struct wanted_link {
+    std::string path;
+    std::optional<std::string> target;
+};
+
+/// Has the link replaced in the imagination. Throws what would forbid that on the disk.
+void imagine(const wanted_link& wanted);
+
+/// The version that a killed tzctl was about to make current.
+[[nodiscard]] std::optional<std::string> unfinished_use();
+
+/// As long as this lives, no other tzctl changes anything, and an interruption ends this one only
+/// where it asks for that. Everything half-made has a temporary name, and is removed at the
+/// beginning, whoever left it, and at the end. What cannot be removed is in nobody's way.
+class work {
+  public:
+    /// Throws std::exception if another tzctl is running, or if the directory of updates is a
+    /// symbolic link, which could lead root to somewhere else.
+    work();
+    work(const work&) = delete;
+    work& operator=(const work&) = delete;
+    ~work();
+
+    [[nodiscard]] const fs::descriptor& state() const { return state_; }
+    [[nodiscard]] const fs::descriptor& updates() const { return updates_; }
+
+    /// Replaces the links in their order, each in one step: a reader always finds what was there or
+    /// what will be. What was there may be of any type but a directory. After a failure everything
+    /// is as before. With a `version`, that is noted meanwhile as the unfinished use.
+    void replace(const std::vector<wanted_link>& wanted, const std::string& version = "") const;
+
+    void forget_unfinished_use() const;
+
+  private:
+    void note_unfinished_use(const std::string& version) const;
+    void remove_half_made() const;
+
+    fs::descriptor state_;
+    fs::descriptor updates_;
+    fs::descriptor lock_;
+};
+
+} // namespace tz

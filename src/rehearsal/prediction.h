@@ -1,0 +1,28 @@
+// SPDX-License-Identifier: BSD-2-Clause
+#pragma once
+
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "rehearsal/imagination.h"
+#include "startup/start_up.h"
+
+namespace tz {
+
+/// What one start would do.
+struct prediction {
+    outcome result;
+    std::optional<std::string> zoneinfo; // targets of the links afterwards, if there are such
+    std::optional<std::string> icutz;
+    std::optional<std::string> localtime;
+    bool changes = false;        // whether any of these differs from now
+    bool has_local_time = false; // whether the local-time link then leads to something
+    std::vector<std::string> warnings;
+};
+
+/// Runs a start in `imagined`, after the changes noted there. Throws std::system_error if that
+/// meets a failure that another start might not meet.
+[[nodiscard]] prediction predict_start(imagination::session& imagined);
+
+} // namespace tz
