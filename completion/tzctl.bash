@@ -13,22 +13,24 @@ _tzctl() {
         esac
     done
 
-    local words=() directories='' name
+    local words=() directories='' versions='' name
     case $before,$verb in
     --root,* | =,*) directories=yes ;;
-    *,) words=(status install use cleanup make --root --help --version) ;;
+    *,) words=(status diff check install use cleanup make --json --root --help --version) ;;
     *,status) words=(--json --root) ;;
+    *,diff) words=(system current latest --json --root) versions=yes directories=yes ;;
+    *,check) words=(--root) ;;
     *,install) words=(--force --root) directories=yes ;;
-    *,use)
-        words=(system)
-        for name in "$root"/var/db/timezone/tz/*; do # it may be anybody's, and hold a command
-            [[ ! ${name##*/} =~ ^[0-9a-z.]+$ ]] || words+=("${name##*/}")
-        done
-        ;;
+    *,use) words=(system) versions=yes ;;
     *,cleanup) words=(--dry-run --root) ;;
     make,make) words=(update system) ;;
     *,make) compopt -o default ;;
     esac
+    if [ -n "$versions" ]; then
+        for name in "$root"/var/db/timezone/tz/*; do # any other name may contain a command
+            [[ ! ${name##*/} =~ ^[0-9]+[a-z]+(\.[0-9]+){0,2}$ ]] || words+=("${name##*/}")
+        done
+    fi
     [ -z "$directories" ] || compopt -o filenames
     for name in "${words[@]}"; do
         [[ $name != "$word"* ]] || COMPREPLY+=("$name")
