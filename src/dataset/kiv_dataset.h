@@ -11,20 +11,20 @@
 namespace tz {
 
 /// One complete set of time-zone data: the system's own, or an installed update, which is a
-/// directory such as /var/db/timezone/tz/2016f.1.0, named by its version. Reads the disk when it is
-/// constructed and changes nothing until it is made current.
+/// directory named by its version, such as /var/db/timezone/tz/2016f.1.0. The constructor reads the
+/// disk; only make_current() changes it.
 class kiv_dataset {
   public:
     /// The system's own data. Its version is the word in "+VERSION" followed by ".1.0".
     kiv_dataset() : kiv_dataset(std::string()) {}
 
-    /// The update at `path`; the system's own data if that is empty. A path that names no update
-    /// gives a warning line and throws std::invalid_argument. Data that is missing, or a version of
-    /// the wrong form, is no error. Throws what data_version and the components throw, too.
+    /// The update at `path`; the system's own data if `path` is empty. A path that names no update
+    /// gives a warning line and throws std::invalid_argument. Missing data or a malformed version
+    /// is no error. Also throws what data_version and the components throw.
     explicit kiv_dataset(const std::string& path);
 
-    /// The version as text, for messages and records; of an update all that follows the directory
-    /// of updates in its path.
+    /// The version as text, for messages and records. For an update: the part of its path below the
+    /// directory of updates.
     [[nodiscard]] std::string version_string() const { return version_string_; }
 
     [[nodiscard]] const data_version& version() const { return version_; }
@@ -35,11 +35,11 @@ class kiv_dataset {
     /// Whether each component finds its counterpart in `other` compatible.
     [[nodiscard]] bool compatible_with(const kiv_dataset& other) const;
 
-    /// Makes every component current, the tz database first. The first failure is thrown at once,
-    /// and leaves the later components' links as they were.
+    /// Makes every component current, the tz database first. Throws the first failure at once; the
+    /// links of later components then stay as they were.
     void make_current() const;
 
-    /// The same data: the same path, byte for byte.
+    /// Whether both have the same path, byte for byte.
     friend bool operator==(const kiv_dataset& left, const kiv_dataset& right);
 
     /// Strictly newer, by version.
@@ -54,7 +54,7 @@ class kiv_dataset {
     std::vector<std::shared_ptr<kiv_dataset_component>> components_;
 };
 
-/// Makes the system's own data current. Throws what its construction and make_current throw.
+/// Makes the system's own data current. Throws what the constructor and make_current() throw.
 void reset_to_system_partition();
 
 } // namespace tz

@@ -5,20 +5,19 @@
 
 namespace tz {
 
-/// One kind of time-zone data in a dataset: it has a place on disk, an idea of which other data it
-/// is compatible with, and a link of its own through which the system finds it.
+/// One kind of time-zone data in a dataset, with a directory, a notion of compatibility, and a link
+/// of its own through which the system finds it.
 ///
-/// Components are owned through shared handles made from the concrete type, which therefore destroy
-/// it as what it is; the base cannot be destroyed from outside.
+/// The destructor is protected and not virtual: components are owned through shared_ptr made from
+/// the concrete type, which calls the concrete destructor.
 class kiv_dataset_component {
   public:
-    /// Whether the system can use this component beside `other`, its counterpart in another
-    /// dataset.
+    /// Whether a system whose own component is `other` can use this one.
     [[nodiscard]] virtual bool compatible_schema(const kiv_dataset_component& other) const = 0;
 
-    /// Makes the system's link for this kind of data name this component. The old link is removed
-    /// first; one that cannot be removed is reported by a warning, and creation is tried all the
-    /// same. Throws the `errno` value, an `int`, of a link that could not be created.
+    /// Replaces the system's link for this kind of data by a link to this component. If the old
+    /// link cannot be removed, warns and still tries to create the new one. If that fails, throws
+    /// the `errno` value, an `int`.
     virtual void make_current() const = 0;
 
   protected:
@@ -26,7 +25,7 @@ class kiv_dataset_component {
     explicit kiv_dataset_component(const std::string& dataset_path) : dataset_path_(dataset_path) {}
     ~kiv_dataset_component() = default;
 
-    /// Root of the dataset, such as /var/db/timezone/tz/2016f.1.0; empty for the system's own data.
+    /// The dataset's directory, such as /var/db/timezone/tz/2016f.1.0; empty for the system's own.
     [[nodiscard]] const std::string& dataset_path() const { return dataset_path_; }
 
   private:

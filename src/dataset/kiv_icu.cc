@@ -25,9 +25,9 @@ bool is_world_readable_file(const FTSENT& entry) {
            (entry.fts_statp->st_mode & S_IROTH) != 0;
 }
 
-// The schema of the first data file that `directory` itself lists; empty if it lists none.
+// The schema of the first data file in `directory`, not below it; empty if there is none.
 std::string first_schema_in(std::string directory) {
-    // On 32-bit machines glibc's walk cannot change into a directory that is dated after 2038.
+    // FTS_NOCHDIR: on 32-bit machines glibc's fts cannot enter a directory dated after 2038.
     constexpr int options = FTS_COMFOLLOW | FTS_PHYSICAL | FTS_XDEV | FTS_NOCHDIR;
     std::array<char*, 2> roots{directory.data(), nullptr};
     const std::unique_ptr<FTS, walk_closer> walk(platform::fts_open(roots.data(), options));
@@ -41,7 +41,7 @@ std::string first_schema_in(std::string directory) {
             continue;
         }
         if (entry->fts_info == FTS_D) {
-            // Files below are never taken, and there may be very many of them.
+            // Files below do not count, and there may be very many of them.
             ::fts_set(walk.get(), entry, FTS_SKIP);
         }
         if (is_world_readable_file(*entry)) {

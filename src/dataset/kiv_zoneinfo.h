@@ -18,13 +18,13 @@ class kiv_zoneinfo final : public kiv_dataset_component {
     /// data is no error.
     explicit kiv_zoneinfo(const std::string& dataset_path);
 
-    /// The release; empty if "+VERSION" is missing, unreadable or holds no word.
+    /// The release; empty if "+VERSION" is missing, unreadable or contains no word.
     [[nodiscard]] std::string version() const { return version_; }
 
-    /// Always true: compiled zone files of any release can be read.
+    /// Always true: the C library reads compiled zones of every release.
     [[nodiscard]] bool compatible_schema(const kiv_dataset_component& other) const override;
 
-    /// Replaces the zoneinfo link, as the base says.
+    /// Replaces the zoneinfo link as the base describes.
     void make_current() const override;
 
   private:

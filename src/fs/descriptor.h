@@ -7,7 +7,7 @@
 
 namespace tz::fs {
 
-/// Owner of what open(2) returned: a file descriptor, or -1 after a failure.
+/// Owns what open(2) returned: a file descriptor, or -1 after a failure.
 class descriptor {
   public:
     explicit descriptor(int number) : number_(number) {}

@@ -65,7 +65,7 @@ void set_protection_class(const std::string& path) {
 }
 
 std::string read_word(const std::string& path) {
-    // Non-blocking, for a FIFO without a writer would hold up the start for ever.
+    // Non-blocking: opening a FIFO without a writer would block the boot.
     const descriptor file(
         platform::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY));
     struct stat status {};

@@ -11,7 +11,7 @@ namespace tz::platform {
 void prepare_process() {
     for (int descriptor = STDIN_FILENO; descriptor <= STDERR_FILENO; ++descriptor) {
         if (::fcntl(descriptor, F_GETFD) == -1) {
-            (void)::open("/", O_RDONLY); // always exists, and nothing can be written to it
+            (void)::open("/", O_RDONLY); // always exists and cannot be written to
         }
     }
     (void)std::signal(SIGPIPE, SIG_IGN);

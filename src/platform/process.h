@@ -3,9 +3,9 @@
 
 namespace tz::platform {
 
-/// Called first by every main. Makes the standard descriptors valid, so that no file opened later
-/// takes the place of one that is closed, and warnings land in that file. Lets writes that nobody
-/// reads, or past a size limit, fail rather than kill: they must not stop the work.
+/// Every main calls this first. Opens standard descriptors that are closed: otherwise a file opened
+/// later could become standard error and receive the warnings. Ignores SIGPIPE and SIGXFSZ, so that
+/// a write that nobody reads, or past a size limit, fails but does not end the program.
 void prepare_process();
 
 } // namespace tz::platform

@@ -11,7 +11,7 @@
 #include <err.h>
 #include <unistd.h>
 
-// The program's name, kept under this symbol by the C libraries of Linux and of the BSDs alike.
+// The program's name, in the C libraries of Linux and of the BSDs.
 extern "C" char* __progname; // NOLINT(bugprone-reserved-identifier,cert-dcl*)
 
 namespace tz {
@@ -23,7 +23,7 @@ namespace {
     const int length = std::vsnprintf(nullptr, 0, format, measured);
     va_end(measured);
     if (length < 0) {
-        throw std::bad_alloc(); // longer than INT_MAX, more than printf can count
+        throw std::bad_alloc(); // longer than INT_MAX, which is printf's limit
     }
 
     std::va_list printed;
@@ -47,7 +47,7 @@ void warn(const char* format, ...) {
         [[maybe_unused]] const auto written = ::write(STDERR_FILENO, line.data(), line.size());
     } catch (const std::bad_alloc&) {
         errno = reason;
-        ::vwarn(format, values); // needs no memory, at the price of several writes
+        ::vwarn(format, values); // needs no memory, but makes several writes
     }
     va_end(values);
     errno = reason;

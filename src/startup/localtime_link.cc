@@ -13,12 +13,12 @@ namespace tz {
 namespace {
 
 void replace_localtime_link(const std::string& target) {
-    // Unlike fs::remove, this says nothing of its own, and deletes an empty directory, too.
+    // Unlike fs::remove, this prints nothing, and also deletes an empty directory.
     (void)platform::remove(layout::localtime_link);
     fs::create_symlink(target, layout::localtime_link);
 }
 
-// Whether the link could be left alone or corrected; if not, nothing or an exception says so.
+// Whether the link stays or was corrected. Throws if it could not be read or corrected.
 bool keep_or_correct_localtime_link() {
     std::string target = fs::read_symlink(layout::localtime_link);
     if (target.starts_with(layout::zoneinfo_link)) {
@@ -45,7 +45,7 @@ void repair_localtime_link() {
             return;
         }
     } catch (...) {
-        // The default zone serves for every failure, and its own line follows.
+        // Every failure leads to the default zone, with the warning line below.
     }
     warn("localtime link invalid; resetting to %s", layout::default_zone);
     replace_localtime_link(std::string(layout::zoneinfo_link) + "/" + layout::default_zone);

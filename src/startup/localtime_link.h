@@ -3,12 +3,12 @@
 
 namespace tz {
 
-/// Makes sure that the local-time link leads through the zoneinfo link, so that the local zone
-/// follows the current data. A link that does is left alone, whether or not its zone exists; a link
-/// into the legacy tz database is corrected if the current data has that zone; anything else is
-/// replaced by a link to the default zone. All but the first give warning lines.
+/// Makes the local-time link lead through the zoneinfo link, so that local time follows the current
+/// data. A link that does stays, whether or not its zone exists. A link into the legacy tz database
+/// is corrected if the current data has that zone. Anything else is replaced by a link to the
+/// default zone. Both changes give warning lines.
 ///
-/// Throws the `errno` value, an `int`, if the link to the default zone could not be created.
+/// If the link to the default zone cannot be created, throws the `errno` value, an `int`.
 void repair_localtime_link();
 
 } // namespace tz

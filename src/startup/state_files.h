@@ -9,9 +9,9 @@ namespace tz {
 /// line.
 void touch_needs_cleanup();
 
-/// Writes the record of the last adoption anew: the version of the dataset that was replaced, "_",
-/// and the version of the update that replaced it, without a newline. A record that cannot be
-/// written, such as a FIFO that nobody reads, is left out silently.
+/// Rewrites the record of the last adoption: the version of the dataset that was replaced, "_", and
+/// the version of the update that replaced it, without a newline. A failure is silent, and a FIFO
+/// that nobody reads is one.
 ///
 /// Example: 2016a.1.0_2016b.1.0
 void write_version_diff_record(const kiv_dataset& effective, const kiv_dataset& latest);

@@ -17,7 +17,7 @@ bool is_letter(char c) {
     return 'a' <= c && c <= 'z';
 }
 
-// Cuts the run of bytes that are of one kind off the front of `text`, and returns it.
+// Removes the leading bytes of one kind from `text` and returns them.
 std::string_view take(std::string_view& text, bool (*is_of_kind)(char)) {
     const std::string_view run(text.begin(),
                                std::find_if_not(text.begin(), text.end(), is_of_kind));
@@ -25,7 +25,7 @@ std::string_view take(std::string_view& text, bool (*is_of_kind)(char)) {
     return run;
 }
 
-// The same for a dot and the digits after it; a dot without digits stays where it is.
+// The same for a dot and the digits after it; returns the digits. A dot without digits stays.
 std::string_view take_dotted_number(std::string_view& text) {
     if (!text.starts_with('.')) {
         return {};

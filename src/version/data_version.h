@@ -7,8 +7,8 @@
 
 namespace tz {
 
-/// The version of a dataset: a release of the tz database, such as 2016a, and the numbers with
-/// which it was shipped, such as .1.0.
+/// The version of a dataset: a release of the tz database, such as 2016a, and up to two numbers,
+/// such as .1.0.
 ///
 /// A default-constructed value is the unknown version, which is older than every other.
 struct data_version {
@@ -19,12 +19,12 @@ struct data_version {
 
     data_version() = default;
 
-    /// Parses `text`, as below.
+    /// Parses `text`; see parse().
     explicit data_version(const std::string& text) { parse(text); }
 
-    /// Sets all fields from a text such as 2016a, 2016a.1 or 2016a.1.0; numbers are decimal, and
-    /// leading zeros do not count. A text of any other form gives two warning lines and the unknown
-    /// version. A number beyond INT_MAX throws std::out_of_range.
+    /// Sets all fields from a text such as 2016a, 2016a.1 or 2016a.1.0. Numbers are decimal;
+    /// leading zeros are ignored. A text of any other form gives two warning lines and the unknown
+    /// version. A number greater than INT_MAX throws std::out_of_range.
     void parse(const std::string& text);
 
     /// Strictly newer: by year, then by letters as bytes, then by the two numbers.
@@ -32,7 +32,7 @@ struct data_version {
     bool operator==(const data_version& other) const = default;
 };
 
-/// The pieces of a version text, as they stand in it; an absent number is empty.
+/// The parts of a version text, unchanged; a missing number is empty.
 struct version_pieces {
     std::string_view year;
     std::string_view letters;
@@ -40,9 +40,9 @@ struct version_pieces {
     std::string_view patch;
 };
 
-/// Takes a version text apart: the whole of it must be
+/// Splits a version text, which must match as a whole:
 /// [0-9]+ [a-z]+ ( "." [0-9]+ ( "." [0-9]+ )? )?
-/// and nothing is returned otherwise. Runs in linear time and constant space.
+/// Returns nothing if it does not. Runs in linear time and constant space.
 [[nodiscard]] std::optional<version_pieces> split_version(std::string_view text);
 
 } // namespace tz
