@@ -78,16 +78,32 @@ foresight foresee(const std::string& place, const std::string& staged) {
     return {std::move(considered), predict_start(imagined)};
 }
 
+bool is_older(const std::string& release, const std::string& than) {
+    return split_version(release) && split_version(than) &&
+           data_version(than) > data_version(release);
+}
+
 // Why the dataset should not be installed; empty if it may be.
-std::string objection(const foresight& next, const std::string& place, bool has_zones) {
+std::string objection(const foresight& next, const std::string& version,
+                      const fs::descriptor& staged, const std::string& shown) {
     const outcome& result = next.start.result;
-    const bool becomes_current =
-        (result.decided == decision::adopt || result.decided == decision::keep) &&
-        result.dataset == place;
-    return !becomes_current
-               ? "the next start would not adopt it: " + reason(result, next.considered)
-           : !has_zones ? "it holds no zone file, so every time zone would be UTC"
-                        : "";
+    if ((result.decided != decision::adopt && result.decided != decision::keep) ||
+        result.dataset != updates::path_of(version)) {
+        return "the next start would not adopt it: " + reason(result, next.considered);
+    }
+    if (!has_zones(staged, shown)) {
+        return "it holds no zone file, so every time zone would be UTC";
+    }
+    const std::string release = release_in(staged, layout::update_zoneinfo);
+    if (!release.empty() && version != release && !version.starts_with(release + ".")) {
+        return "its data is of release " + release;
+    }
+    const std::string icu_release = release_in(staged, layout::update_icu);
+    const std::string current =
+        next.considered.current ? next.considered.current->icu_release : std::string();
+    return is_older(icu_release, current) ? "its ICU data is of release " + icu_release +
+                                                ", which is older than the current " + current
+                                          : "";
 }
 
 void publish(const std::string& version, const std::string& staged, const work& work) {
@@ -116,7 +132,7 @@ void install(const fs::descriptor& source, const std::string& shown, const std::
 
     const std::string place = updates::path_of(version);
     const auto next = foresee(place, updates::path_of(staged_name));
-    const std::string against = objection(next, place, has_zones(staged, shown));
+    const std::string against = objection(next, version, staged, shown);
     if (!against.empty() && !forced) {
         refuse(shown, against);
     }

@@ -65,6 +65,7 @@ ordered_json described(const dataset& data) {
             {"version", in_utf8(data.version)},
             {"release", word_or_null(data.release)},
             {"schema", word_or_null(data.schema)},
+            {"icu_release", word_or_null(data.icu_release)},
             {"compatible", data.compatible},
             {"newer_than_system", data.newer_than_system}};
 }
@@ -84,6 +85,12 @@ ordered_json described(const std::vector<dataset>& all) {
 ordered_json described(const link& link) {
     return {
         {"path", link.path}, {"target", text_or_null(link.target)}, {"state", name_of(link.state)}};
+}
+
+ordered_json described(const reader& reader) {
+    return {{"path", reader.path},
+            {"target", text_or_null(reader.target)},
+            {"follows", reader.follows}};
 }
 
 ordered_json described(const prediction& next, const candidates& linked) {
@@ -113,6 +120,9 @@ void print_as_json(const survey& found) {
                                 {"icutz", described(found.icutz)},
                                 {"tz_latest", described(found.tz_latest)},
                                 {"localtime", described(found.localtime)}}},
+                              {"readers",
+                               {{"zoneinfo", described(found.zoneinfo_reader)},
+                                {"localtime", described(found.etc_localtime)}}},
                               {"marker", found.marker},
                               {"record", text_or_null(found.record)},
                               {"next_start", described(found.next_start, found.linked)},

@@ -81,16 +81,18 @@ void declare(CLI::App& app, command_line& given) {
     };
     app.add_option("--root", given.root, "Work on the system image in this directory")
         ->check(not_empty);
+    app.get_formatter()->column_width(20);
+    app.add_flag("--json", given.json, "Print a JSON object, for programs (status)");
     app.require_subcommand(0, 1);
     app.fallthrough();
 
-    app.add_subcommand("status", "Show what is current and what the next start will do (default)")
-        ->add_flag("--json", given.json, "Print a JSON object, for programs");
+    app.add_subcommand("status", "Show what is current and what the next start will do (default)");
     auto* const install = app.add_subcommand("install", "Install an update for the next start");
     install->add_option("DATASET", given.dataset, "Directory that tzctl make has made")
         ->required()
         ->check(not_empty);
     install->add_flag("--force", given.forced, "Install it even if no start would adopt it");
+    app.add_subcommand("check", "Print one line for a monitoring system");
     app.add_subcommand("use", "Make an installed update current now, and keep it")
         ->add_option("VERSION", given.version, "Its version; \"system\" for the system's own data")
         ->required()
@@ -102,13 +104,38 @@ void declare(CLI::App& app, command_line& given) {
         ->fallthrough(false);
 }
 
-// The exit status.
-int run(const CLI::App& app, const command_line& given) {
+int check(const command_line& given) {
+    try {
+        enter_root_if_any(given.root);
+        return tz::print_check();
+    } catch (const std::exception& error) {
+        return tz::print_unknown(error.what());
+    }
+}
+
+void refuse_combinations(const CLI::App& app, const command_line& given) {
+    const bool prints_json = app.get_subcommands().empty() || app.got_subcommand("status");
+    if (given.json && !prints_json) {
+        throw CLI::ValidationError("--json", "only for status");
+    }
     if (app.got_subcommand("make")) {
         if (!given.root.empty()) {
             throw CLI::ValidationError("make", "takes no --root");
         }
+        if (app.get_subcommand("make")->remaining_size() != 4) {
+            throw CLI::ValidationError("usage", "tzctl make update|system TZDATA ICU DIRECTORY");
+        }
+    }
+}
+
+// The exit status.
+int run(const CLI::App& app, const command_line& given) {
+    refuse_combinations(app, given);
+    if (app.got_subcommand("make")) {
         make(app.get_subcommand("make")->remaining());
+    }
+    if (app.got_subcommand("check")) {
+        return check(given);
     }
     if (app.got_subcommand("install")) {
         install(given);
@@ -130,6 +157,9 @@ int run(const CLI::App& app, const command_line& given) {
 int refuse_usage(const CLI::App& app, const CLI::ParseError& error) {
     if (error.get_exit_code() == 0) { // it is the help or the version that was asked for
         return app.exit(error);
+    }
+    if (app.got_subcommand("check")) {
+        return tz::print_unknown(error.what());
     }
     std::cerr << "tzctl: " << tz::printable(error.what())
               << "\nRun \"tzctl --help\" for more information.\n";

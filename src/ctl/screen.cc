@@ -44,8 +44,9 @@ void print_dataset(const dataset& data, const candidates& linked) {
     const auto yes_or_no = [&](bool holds) {
         return data.path.empty() ? " " : holds ? "yes" : "no";
     };
-    std::cout << "  " << cell(data.version, 15) << cell(data.release, 8) << cell(data.schema, 7)
-              << cell(yes_or_no(data.compatible), 11) << cell(yes_or_no(data.newer_than_system), 6)
+    std::cout << "  " << cell(data.version, 15) << cell(data.release, 8)
+              << cell(data.icu_release, 6) << cell(data.schema, 6)
+              << cell(yes_or_no(data.compatible), 10) << cell(yes_or_no(data.newer_than_system), 5)
               << role_of(data, linked) << '\n';
 }
 
@@ -59,6 +60,22 @@ void print_link(const std::string& name, const link& link) {
     }
 }
 
+void print_reader(const reader& reader) {
+    std::cout << "  " << cell(reader.path, 19);
+    if (reader.target) {
+        std::cout << "-> " << printable(*reader.target);
+    } else {
+        std::cout << "is not a link";
+    }
+    std::cout << (reader.follows ? "" : " (not through the current link)") << '\n';
+}
+
+// A start that has nothing to do compares the latest update with itself, and prints that.
+bool is_usual(const prediction& next, const candidates& linked) {
+    return next.result.decided == decision::keep && next.warnings.size() == 1 && linked.latest &&
+           linked.latest->path == next.result.dataset;
+}
+
 } // namespace
 
 void print_for_people(const survey& found) {
@@ -67,13 +84,16 @@ void print_for_people(const survey& found) {
     std::cout << wrapped(reason(next.result, found.linked), 2);
     if (!next.warnings.empty()) {
         std::cout << '\n';
-        print_title("It will say");
+        print_title("It will print");
     }
     for (const auto& line : next.warnings) {
         std::cout << wrapped(line, 2);
     }
+    if (is_usual(next, found.linked)) {
+        std::cout << "  (This is usual while the latest update is current.)\n";
+    }
     std::cout << '\n';
-    print_title("Datasets          release  schema  compatible  newer");
+    print_title("Datasets          release  ICU    schema compatible newer");
     for (const auto& data : found.installed) {
         print_dataset(data, found.linked);
     }
@@ -86,6 +106,10 @@ void print_for_people(const survey& found) {
     print_link("icutz", found.icutz);
     print_link("tz_latest", found.tz_latest);
     print_link("localtime", found.localtime);
+    std::cout << '\n';
+    print_title("What programs read");
+    print_reader(found.zoneinfo_reader);
+    print_reader(found.etc_localtime);
     std::cout << "\nLast adoption: " << printable(found.record.value_or("none")) << '\n'
               << "Clean-up pending: " << (found.marker ? "yes" : "no") << '\n';
     if (!found.findings.empty()) {

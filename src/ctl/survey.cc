@@ -14,6 +14,7 @@
 #include "ctl/root.h"
 #include "ctl/tree.h"
 #include "ctl/updates.h"
+#include "ctl/way.h"
 #include "ctl/work.h"
 #include "dataset/kiv_dataset.h"
 #include "fs/layout.h"
@@ -22,6 +23,8 @@
 
 namespace tz {
 namespace {
+
+const std::string version_file = layout::zoneinfo_version_file; // in ICU's data, too
 
 // The beginning of a regular file; nothing if there is none.
 std::optional<std::string> beginning_of(int directory, const std::string& path) {
@@ -36,18 +39,10 @@ std::optional<std::string> beginning_of(int directory, const std::string& path) 
     return std::string(text.data(), static_cast<std::size_t>(length));
 }
 
-// Unlike a start's own way to the word, this one leads out of no update, since the word is printed.
-std::string release_of(const std::string& version) {
+// The first word of a regular file, or nothing.
+std::string word_in(int directory, const std::string& path) {
     constexpr char white_space[] = " \t\n\v\f\r";
-    const auto updates = updates::open_directory();
-    const std::string path = version + layout::update_zoneinfo;
-    const std::string shown = in_image(updates::path_of(path));
-    const auto directory =
-        updates ? tree::open_directory(updates->number(), path, shown) : std::nullopt;
-    const std::string text =
-        directory
-            ? beginning_of(directory->number(), layout::zoneinfo_version_file + 1).value_or("")
-            : "";
+    const std::string text = beginning_of(directory, path).value_or("");
     const auto begin = std::min(text.find_first_not_of(white_space), text.size());
     return text.substr(begin, text.find_first_of(white_space, begin) - begin);
 }
@@ -77,8 +72,15 @@ std::optional<dataset> describe(const std::string& path, const std::optional<kiv
     } catch (...) {
         return std::nullopt;
     }
-    found.release = path.empty() ? found.version.substr(0, found.version.rfind(".1.0"))
-                                 : release_of(found.version);
+    if (path.empty()) {
+        found.release = found.version.substr(0, found.version.rfind(".1.0"));
+        found.icu_release = word_in(AT_FDCWD, layout::system_icu + version_file);
+    } else if (const auto updates = updates::open_directory()) {
+        if (const auto update = tree::open_directory(updates->number(), found.version, path)) {
+            found.release = release_in(*update, layout::update_zoneinfo);
+            found.icu_release = release_in(*update, layout::update_icu);
+        }
+    }
     return found;
 }
 
@@ -110,26 +112,20 @@ std::vector<dataset> describe_installed() {
     return all;
 }
 
-// Whether the path, links followed, leads to something.
-bool leads_to_something(const char* path) {
-    const fs::descriptor there(::open(path, O_PATH | O_CLOEXEC));
-    const bool nowhere =
-        !there.is_open() && (is_missing() || errno == ELOOP || errno == ENAMETOOLONG);
-    check(there.is_open() || nowhere ? 0 : -1, in_image(path));
-    return there.is_open();
-}
-
-bool is_regular_file(const char* path) {
-    struct stat status {};
-    return leads_to_something(path) && ::stat(path, &status) == 0 && S_ISREG(status.st_mode);
-}
-
 link describe_link(const char* path) {
     const auto target = updates::target_of(path);
     if (target) {
-        return {path, target, leads_to_something(path) ? link_state::ok : link_state::dangling};
+        return {path, target, follow(path).leads_somewhere ? link_state::ok : link_state::dangling};
     }
     return {path, target, updates::exists(path) ? link_state::not_a_link : link_state::missing};
+}
+
+reader describe_reader(const char* path) {
+    struct stat current {};
+    const bool has_current = ::lstat(layout::zoneinfo_link, &current) == 0;
+    const way there = follow(path);
+    return {path, updates::target_of(path),
+            has_current && there.passes({current.st_dev, current.st_ino})};
 }
 
 bool holds_zones(const std::string& zoneinfo) {
@@ -138,43 +134,73 @@ bool holds_zones(const std::string& zoneinfo) {
     return directory.is_open() && tree::holds_zones(directory, in_image(zoneinfo));
 }
 
-// What is wrong, beside the warning lines that looking at it has given.
-std::vector<std::string> problems_in(const survey& found) {
-    std::vector<std::string> all;
+// What is wrong with the data.
+void add_problems_of_data(const survey& found, std::vector<std::string>& all) {
     const auto add = [&](bool holds, const std::string& problem) {
-        if (holds) {
-            all.push_back(problem);
-        }
+        all.insert(all.end(), holds ? 1 : 0, problem);
     };
+    const auto& current = found.linked.current;
+    const outcome& next = found.next_start.result;
+    add(!updates::exists(layout::state_directory),
+        std::string(layout::state_directory) +
+            " is missing: systemd-tmpfiles creates it at boot, or whoever builds the system.");
     for (const auto& data : found.installed) {
         add(!data.readable, data.version + ": the version holds a number beyond 2147483647");
     }
-    const auto& current = found.linked.current;
-    const bool update = current && !current->path.empty();
     add(!found.linked.system, "No start can use the system's own data.");
     add(!holds_zones(layout::system_zoneinfo),
         std::string("There is no zone file in ") + layout::system_zoneinfo + ".");
-    add(update && !holds_zones(current->path + layout::update_zoneinfo),
-        "The current update holds no zone file: every time zone is UTC.");
+    add(current && !found.current_has_zones,
+        "The current data holds no zone file: every time zone is UTC.");
+    add(next.decided == decision::drop && next.current == verdict::not_newer,
+        "The current update is older than the system's own data: \"tzctl use system\" makes that "
+        "current at once.");
+}
+
+// What is wrong with the links, and with what they lead to.
+void add_problems_of_links(const survey& found, std::vector<std::string>& all) {
+    const auto add = [&](bool holds, const std::string& problem) {
+        all.insert(all.end(), holds ? 1 : 0, problem);
+    };
+    const auto& current = found.linked.current;
+    const bool update = current && !current->path.empty();
+    const prediction& next = found.next_start;
     add(update && found.icutz.target != current->path + layout::update_icu,
         "The ICU link does not lead into the current update: \"tzctl use\" corrects that.");
     add(current && !update && found.icutz.state != link_state::missing,
         "The ICU link is left over, as the system's own data is current: \"tzctl use system\" "
         "corrects that.");
     add(found.tz_latest.state == link_state::dangling, "The latest link leads nowhere.");
-    add(found.localtime.state != link_state::missing && !is_regular_file(layout::localtime_link),
-        "The local-time link leads to no zone file: local time is UTC.");
-    add(found.localtime.state == link_state::ok && !found.next_start.has_local_time,
+    for (const auto& link : {found.zoneinfo, found.icutz, found.localtime}) {
+        add(link.state == link_state::ok && !follow(link.path).is_open_to_others(),
+            "Only root can read what " + link.path + " leads to.");
+    }
+    const bool is_read = found.etc_localtime.follows;
+    add(found.localtime.state != link_state::missing &&
+            !follow(layout::localtime_link).leads_to_zone(),
+        std::string("The local-time link leads to no compiled zone file") +
+            (is_read ? ": local time is UTC." : "."));
+    add(next.localtime && next.localtime != found.localtime.target,
+        "The local-time link is " +
+            std::string(found.localtime.state == link_state::missing ? "missing" : "invalid") +
+            ": the next start makes it lead to " + next.localtime.value_or("") + ".");
+    add(found.localtime.state == link_state::ok && !next.has_local_time,
         "The next start makes data current that lacks the local zone.");
     if (const auto version = unfinished_use()) {
         add(true, "\"tzctl use " + *version +
                       "\" was interrupted: the next tzctl that changes "
                       "something completes it.");
     }
-    return all;
 }
 
 } // namespace
+
+// Unlike a start's own way to the word, this one leads out of no dataset, since the word is
+// printed.
+std::string release_in(const fs::descriptor& dataset, const std::string& component) {
+    const auto directory = tree::open_directory(dataset.number(), component.substr(1), component);
+    return directory ? word_in(directory->number(), version_file.substr(1)) : "";
+}
 
 candidates look_at_candidates() {
     const auto path_or_none = [](std::string (*read)()) -> std::optional<std::string> {
@@ -205,15 +231,18 @@ survey look() {
     found.icutz = describe_link(layout::icu_link);
     found.tz_latest = describe_link(layout::latest_link);
     found.localtime = describe_link(layout::localtime_link);
-    found.marker = leads_to_something(layout::cleanup_marker);
+    found.marker = follow(layout::cleanup_marker).leads_somewhere;
     found.record = beginning_of(AT_FDCWD, layout::version_diff_record);
     {
         imagination::session imagined;
         found.next_start = predict_start(imagined);
     }
+    found.zoneinfo_reader = describe_reader(layout::legacy_zoneinfo);
+    found.etc_localtime = describe_reader("/etc/localtime");
+    found.current_has_zones = holds_zones(layout::zoneinfo_link);
+    add_problems_of_data(found, found.findings);
+    add_problems_of_links(found, found.findings);
     std::set<std::string> known;
-    const auto problems = problems_in(found);
-    found.findings.insert(found.findings.end(), problems.begin(), problems.end());
     std::erase_if(found.findings,
                   [&](const std::string& finding) { return !known.insert(finding).second; });
     return found;

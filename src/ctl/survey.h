@@ -5,6 +5,7 @@
 #include <string>
 #include <vector>
 
+#include "fs/descriptor.h"
 #include "rehearsal/prediction.h"
 #include "version/data_version.h"
 
@@ -16,6 +17,7 @@ struct dataset {
     std::string version;     // such as 2016b.1.0
     std::string release;     // the word in "+VERSION", or empty
     std::string schema;      // of the ICU data, or empty
+    std::string icu_release; // the word in its "+VERSION", or empty
     data_version order;      // of the version
     bool readable = true;    // by a start, which cannot read a number beyond INT_MAX
     bool compatible = false; // with the system's ICU library
@@ -38,6 +40,13 @@ struct link {
     link_state state = link_state::missing;
 };
 
+/// Where programs look for zones, or for local time.
+struct reader {
+    std::string path;
+    std::optional<std::string> target; // if it is a link
+    bool follows = false;              // whether the current link is on its way
+};
+
 struct survey {
     candidates linked;
     std::vector<dataset> installed; // newest first
@@ -45,6 +54,9 @@ struct survey {
     link icutz;
     link tz_latest;
     link localtime;
+    reader zoneinfo_reader;
+    reader etc_localtime;
+    bool current_has_zones = false;
     bool marker = false; // an update may be removed
     std::optional<std::string> record;
     prediction next_start;
@@ -54,6 +66,10 @@ struct survey {
 /// Looks at everything, and changes nothing. Throws std::exception if something cannot be looked
 /// at, so what is found missing is missing.
 [[nodiscard]] survey look();
+
+/// The release of a component, such as "/zoneinfo", of a dataset: the word in its "+VERSION", or
+/// empty.
+[[nodiscard]] std::string release_in(const fs::descriptor& dataset, const std::string& component);
 
 /// What the current and the latest link name now, in the imagination.
 [[nodiscard]] candidates look_at_candidates();

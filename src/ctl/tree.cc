@@ -209,15 +209,6 @@ bool has_everything_of(const fs::descriptor& one, const fs::descriptor& other,
     });
 }
 
-bool is_zone(const item& file) {
-    const fs::descriptor zone = open_regular_file(file.directory, file.name);
-    std::array<char, 4> magic{};
-    check(zone.number(), file.path);
-    const ssize_t length = ::read(zone.number(), magic.data(), magic.size());
-    check(length, file.path);
-    return std::string_view(magic.data(), static_cast<std::size_t>(length)) == "TZif";
-}
-
 // Removes entries, but moves what lies too deep up into the directory where it began.
 class remover {
   public:
@@ -323,9 +314,19 @@ bool equal(const fs::descriptor& one, const fs::descriptor& other, const std::st
            has_everything_of(other, one, shown); // NOLINT(*-suspicious-call-argument)
 }
 
+bool is_zone(int directory, const std::string& name, const std::string& shown) {
+    const fs::descriptor file = open_regular_file(directory, name);
+    std::array<char, 4> magic{};
+    check(file.number(), shown);
+    const ssize_t length = ::read(file.number(), magic.data(), magic.size());
+    check(length, shown);
+    return std::string_view(magic.data(), static_cast<std::size_t>(length)) == "TZif";
+}
+
 bool holds_zones(const fs::descriptor& zoneinfo, const std::string& shown) {
-    return walk(zoneinfo, shown, [](const item& entry) {
-        if (S_ISREG(entry.status.st_mode) && is_zone(entry)) {
+    return walk(zoneinfo, shown, [&](const item& entry) {
+        if (S_ISREG(entry.status.st_mode) &&
+            is_zone(entry.directory, entry.name, shown + "/" + entry.path)) {
             return next::stop;
         }
         return entry.path == "posix" || entry.path == "right" ? next::skip : next::descend;

@@ -33,6 +33,9 @@ void copy(const fs::descriptor& source, const fs::descriptor& copy, const std::s
 [[nodiscard]] bool equal(const fs::descriptor& one, const fs::descriptor& other,
                          const std::string& shown);
 
+/// Whether the regular file `name` in `directory` begins as a compiled zone file.
+[[nodiscard]] bool is_zone(int directory, const std::string& name, const std::string& shown);
+
 /// Whether `zoneinfo` has a compiled zone file, other than in posix/ and right/: there no program
 /// looks for a zone.
 [[nodiscard]] bool holds_zones(const fs::descriptor& zoneinfo, const std::string& shown);

@@ -4,8 +4,6 @@
 #include <algorithm>
 #include <array>
 #include <climits>
-#include <set>
-#include <utility>
 
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -14,6 +12,7 @@
 #include "ctl/failure.h"
 #include "ctl/root.h"
 #include "ctl/tree.h"
+#include "ctl/way.h"
 #include "fs/layout.h"
 #include "startup/links.h"
 #include "version/data_version.h"
@@ -21,45 +20,9 @@
 namespace tz::updates {
 namespace {
 
-using identity = std::pair<dev_t, ino_t>;
-
 constexpr char unknown_use[] = "names nothing, so nobody knows which updates are in use";
 
-// Adds every entry on the way to `path`, which is absolute: directories, links, and what they lead
-// to, as far as that is there.
-void add_way_to(std::string path, std::set<identity>& passed) {
-    constexpr int most_links = 40; // that Linux follows
-    const std::string shown = in_image(path);
-    int links = 0;
-    fs::descriptor at(::open("/", O_PATH | O_CLOEXEC));
-    while (!path.empty() && links <= most_links) {
-        const auto slash = std::min(path.find('/'), path.size());
-        const std::string name = slash == 0 ? "." : path.substr(0, slash);
-        path.erase(0, slash + 1);
-        fs::descriptor next(::openat(at.number(), name.c_str(), O_PATH | O_NOFOLLOW | O_CLOEXEC));
-        if (!next.is_open() && is_missing()) {
-            return;
-        }
-        struct stat status {};
-        check(next.number(), shown);
-        check(::fstat(next.number(), &status), shown);
-        passed.emplace(status.st_dev, status.st_ino);
-        if (!S_ISLNK(status.st_mode)) {
-            at = std::move(next);
-            continue;
-        }
-        std::array<char, PATH_MAX> target{};
-        const ssize_t length = ::readlinkat(next.number(), "", target.data(), target.size());
-        check(length, shown);
-        path.insert(0, std::string(target.data(), static_cast<std::size_t>(length)) + "/");
-        ++links;
-        if (path.starts_with('/')) {
-            at = fs::descriptor(::open("/", O_PATH | O_CLOEXEC));
-        }
-    }
-}
-
-std::set<identity> places_in_use() {
+std::vector<way> ways_in_use() {
     const auto current = target_of(layout::zoneinfo_link);
     try {
         (void)dataset_path_from_zoneinfo_link(current.value_or(""));
@@ -69,12 +32,12 @@ std::set<identity> places_in_use() {
     if (exists(layout::latest_link) && !target_of(layout::latest_link)) {
         refuse(in_image(layout::latest_link), unknown_use);
     }
-    std::set<identity> places;
+    std::vector<way> ways;
     for (const char* link :
          {layout::zoneinfo_link, layout::icu_link, layout::latest_link, layout::localtime_link}) {
-        add_way_to(link, places);
+        ways.push_back(follow(link));
     }
-    return places;
+    return ways;
 }
 
 } // namespace
@@ -112,13 +75,15 @@ std::vector<std::string> installed(const fs::descriptor& directory) {
 }
 
 std::vector<std::string> removable(const fs::descriptor& directory) {
-    const auto in_use = places_in_use();
+    const auto in_use = ways_in_use();
     auto versions = installed(directory);
     std::erase_if(versions, [&](const std::string& version) {
         struct stat status {};
         check(::fstatat(directory.number(), version.c_str(), &status, AT_SYMLINK_NOFOLLOW),
               in_image(path_of(version)));
-        return in_use.contains({status.st_dev, status.st_ino});
+        return std::any_of(in_use.begin(), in_use.end(), [&](const way& one) {
+            return one.passes({status.st_dev, status.st_ino});
+        });
     });
     return versions;
 }

@@ -25,6 +25,13 @@ void use(const std::string& version);
 /// Completes the use of a version that was killed, as well as that is possible now.
 void finish_interrupted_use(const work& work);
 
+/// Prints one line for a monitoring system, in the form of its plugins, and returns the exit status
+/// of a plugin: 0 if everything is fine, 1 for a warning, 2 if it is critical, 3 if nobody knows.
+[[nodiscard]] int print_check();
+
+/// The line and the status for what cannot be checked.
+[[nodiscard]] int print_unknown(const std::string& why);
+
 /// Deletes the installed updates that are not in use; with `rehearsed`, only lists them. Names on
 /// standard error what cannot be deleted, and returns false then.
 [[nodiscard]] bool clean_up(bool rehearsed);
