@@ -111,6 +111,9 @@ chmod 2700 out
     make system deb/usr/share/zoneinfo/tzdata.zi 44/le out/share
 ) >said 2>&1
 [ ! -s said ] || fail "said: $(cat said)"
+[ "$(grep -chx '2[0-9]*[a-z]*' out/2016b.1.0/icutz/+VERSION out/share/icu/+VERSION)" = '1
+1' ] || fail "the release of ICU's data is missing"
+rm out/*/icu*/+VERSION
 (cd out && find 2016b.1.0 share -type f -perm 644 -o -type d ! -perm 755 | sort &&
     cat share/icu/*.txt ./*/zoneinfo*/+VERSION ./*/zoneinfo*/zone.tab) | xargs -n 3 | diff /dev/fd/3 - 3<<'END'
 2016b.1.0/icutz/icutz44l.dat 2016b.1.0/icutz/metaZones.res 2016b.1.0/icutz/timezoneTypes.res
@@ -127,6 +130,7 @@ END
 while read -r icu schema reference; do
     make update 9999a.zi "$icu" out/9999a >said 2>&1
     grep -q "$icu.*: release 2[0-9]*[a-z] is older than 9999a" said || fail "$(cat said)"
+    rm out/9999a/icutz/+VERSION
     icupkg --auto_toc_prefix -d tmp -x items.txt "out/9999a/icutz/icutz$schema.dat"
     rm "out/9999a/icutz/icutz$schema.dat"
     diff -r tmp "$reference"

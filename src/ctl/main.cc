@@ -86,7 +86,7 @@ void declare(CLI::App& app, command_line& given) {
     app.require_subcommand(0, 1);
     app.fallthrough();
 
-    app.add_subcommand("status", "Show what is current and what the next start will do (default)");
+    app.add_subcommand("status", "Show what is current and what the next start does (default)");
     auto* const install = app.add_subcommand("install", "Install an update for the next start");
     install->add_option("DATASET", given.dataset, "Directory that tzctl make has made")
         ->required()
