@@ -33,10 +33,6 @@ void kiv_dataset::create_components() {
     components_.push_back(std::make_shared<kiv_icu>(path_));
 }
 
-const std::string& kiv_dataset::schema() const {
-    return dynamic_cast<const kiv_icu&>(*components_.back()).schema();
-}
-
 bool kiv_dataset::compatible_with(const kiv_dataset& other) const {
     return std::equal(
         components_.begin(), components_.end(), other.components_.begin(), other.components_.end(),

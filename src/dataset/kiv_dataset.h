@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "dataset/kiv_dataset_component.h"
+#include "dataset/kiv_icu.h"
 #include "version/data_version.h"
 
 namespace tz {
@@ -30,7 +31,9 @@ class kiv_dataset {
     [[nodiscard]] const data_version& version() const { return version_; }
 
     /// The schema of the ICU data; empty if none was found.
-    [[nodiscard]] const std::string& schema() const;
+    [[nodiscard]] const std::string& schema() const {
+        return dynamic_cast<const kiv_icu&>(*components_.back()).schema();
+    }
 
     /// Whether each component finds its counterpart in `other` compatible.
     [[nodiscard]] bool compatible_with(const kiv_dataset& other) const;

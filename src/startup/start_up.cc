@@ -45,20 +45,21 @@ void adopt(const kiv_dataset& latest, const kiv_dataset& effective, const kiv_da
 void reconcile(outcome& so_far) {
     const kiv_dataset system;
     so_far.latest = verdict::failed;
-    const std::string latest_path = read_latest_link();
+    std::string latest_path = read_latest_link();
     so_far.latest = latest_path.empty() ? verdict::none : verdict::unknown;
     so_far.current = verdict::failed;
-    so_far.dataset = current_dataset_path_or_reset(so_far);
-    const kiv_dataset current(so_far.dataset);
+    std::string current_path = current_dataset_path_or_reset(so_far);
+    const kiv_dataset current(current_path);
 
     const verdict found = judge_current(current, system);
     const bool kept = found == verdict::fits;
     if (so_far.current != verdict::none) {
         so_far.current = found;
     }
-    if (!kept) {
+    if (kept) {
+        so_far.dataset.swap(current_path);
+    } else {
         so_far.decided = decision::drop;
-        so_far.dataset.clear();
         drop_current();
     }
     const kiv_dataset& effective = kept ? current : system;
@@ -71,7 +72,7 @@ void reconcile(outcome& so_far) {
     so_far.latest = judge_latest(latest, current, system);
     if (so_far.latest == verdict::fits) {
         so_far.decided = decision::adopt;
-        so_far.dataset = latest_path;
+        so_far.dataset.swap(latest_path);
         adopt(latest, effective, system);
     } else {
         warn("New update not compatible or older version: %s vs. %s",
