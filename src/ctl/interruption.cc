@@ -2,6 +2,7 @@
 #include "ctl/interruption.h"
 
 #include <csignal>
+#include <initializer_list>
 #include <stdexcept>
 
 namespace tz {

@@ -25,7 +25,7 @@ namespace tz {
 namespace {
 
 constexpr char lock_name[] = ".tzctl.lock";
-constexpr char unfinished[] = ".tzctl.use.";
+constexpr char unfinished[] = ".tzctl.use";
 
 constexpr int directory_flags = O_RDONLY | O_DIRECTORY | O_CLOEXEC;
 
