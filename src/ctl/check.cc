@@ -13,27 +13,24 @@ struct service_state {
     std::string text;
 };
 
+std::string first_of(const std::vector<std::string>& findings) {
+    const auto more = findings.size() - 1;
+    return findings.front() + (more == 0 ? "" : " (and " + std::to_string(more) + " more)");
+}
+
 service_state state_of(const survey& found) {
     const outcome& next = found.next_start.result;
-    const std::string headline_of_next = "the next start " + headline(next);
-    if (!found.current_has_zones) {
-        return {2, "the current data cannot be read, so every time zone is UTC"};
-    }
-    if (next.decided == decision::fail) {
-        return {2, headline_of_next};
-    }
+    const bool stays = next.decided == decision::keep || next.decided == decision::adopt;
+    const bool fails = next.decided == decision::fail || !found.current_has_zones;
     if (!found.findings.empty()) {
-        const auto more = found.findings.size() - 1;
-        return {1, found.findings.front() +
-                       (more == 0 ? "" : " (and " + std::to_string(more) + " more)")};
+        return {fails ? 2 : 1, first_of(found.findings)};
     }
-    if (next.decided == decision::keep || next.decided == decision::adopt) {
-        const auto& current = found.linked.current;
-        const std::string name = current ? dataset_name(current->path) : "nothing";
-        return {0, name + " is current" +
-                       (next.decided == decision::adopt ? ", " + headline_of_next : "")};
+    if (fails || !stays) {
+        return {fails ? 2 : 1, "the next start " + headline(next)};
     }
-    return {1, headline_of_next};
+    const std::string current = found.linked.current ? found.linked.current->path : "";
+    return {0, dataset_name(current) + " is current" +
+                   (next.decided == decision::adopt ? ", the next start " + headline(next) : "")};
 }
 
 int print(const service_state& state) {

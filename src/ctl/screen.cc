@@ -67,7 +67,7 @@ void print_reader(const reader& reader) {
     } else {
         std::cout << "is not a link";
     }
-    std::cout << (reader.follows ? "" : " (not through the current link)") << '\n';
+    std::cout << '\n' << (reader.follows ? "" : "    (not through the current link)\n");
 }
 
 // A start that has nothing to do compares the latest update with itself, and prints that.

@@ -139,7 +139,6 @@ void add_problems_of_data(const survey& found, std::vector<std::string>& all) {
     const auto add = [&](bool holds, const std::string& problem) {
         all.insert(all.end(), holds ? 1 : 0, problem);
     };
-    const auto& current = found.linked.current;
     const outcome& next = found.next_start.result;
     add(!updates::exists(layout::state_directory),
         std::string(layout::state_directory) +
@@ -150,8 +149,8 @@ void add_problems_of_data(const survey& found, std::vector<std::string>& all) {
     add(!found.linked.system, "No start can use the system's own data.");
     add(!holds_zones(layout::system_zoneinfo),
         std::string("There is no zone file in ") + layout::system_zoneinfo + ".");
-    add(current && !found.current_has_zones,
-        "The current data holds no zone file: every time zone is UTC.");
+    add(!found.current_has_zones,
+        "The current link leads to no zone file: programs that follow it show UTC for every zone.");
     add(next.decided == decision::drop && next.current == verdict::not_newer,
         "The current update is older than the system's own data: \"tzctl use system\" makes that "
         "current at once.");
@@ -220,11 +219,12 @@ candidates look_at_candidates() {
 
 survey look() {
     survey found;
+    std::vector<std::string> warnings;
     {
         imagination::session as_it_is;
         found.linked = look_at_candidates();
         found.installed = describe_installed();
-        found.findings = as_it_is.take_warnings();
+        warnings = as_it_is.take_warnings();
         as_it_is.check();
     }
     found.zoneinfo = describe_link(layout::zoneinfo_link);
@@ -242,6 +242,7 @@ survey look() {
     found.current_has_zones = holds_zones(layout::zoneinfo_link);
     add_problems_of_data(found, found.findings);
     add_problems_of_links(found, found.findings);
+    found.findings.insert(found.findings.end(), warnings.begin(), warnings.end());
     std::set<std::string> known;
     std::erase_if(found.findings,
                   [&](const std::string& finding) { return !known.insert(finding).second; });

@@ -60,7 +60,7 @@ struct survey {
     bool marker = false; // an update may be removed
     std::optional<std::string> record;
     prediction next_start;
-    std::vector<std::string> findings; // warning lines and sentences
+    std::vector<std::string> findings; // problems, then the warning lines of looking
 };
 
 /// Looks at everything, and changes nothing. Throws std::exception if something cannot be looked

@@ -298,7 +298,7 @@ void copy(const fs::descriptor& source, const fs::descriptor& copy, const std::s
         interruption::check();
         const std::string path = shown + "/" + entry.path;
         if (entry.status.st_uid != top.st_uid && (entry.status.st_mode & S_IROTH) == 0) {
-            refuse(path, "only somebody else than the dataset's owner may read it");
+            refuse(path, "readable only by another user than the dataset's owner");
         }
         copy_item(entry, copy.number(), path);
         return next::descend;
