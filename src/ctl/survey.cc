@@ -144,7 +144,7 @@ void add_problems_of_data(const survey& found, std::vector<std::string>& all) {
         std::string(layout::state_directory) +
             " is missing: systemd-tmpfiles creates it at boot, or whoever builds the system.");
     for (const auto& data : found.installed) {
-        add(!data.readable, data.version + ": the version holds a number beyond 2147483647");
+        add(!data.readable, why_unreadable(data));
     }
     add(!found.linked.system, "No start can use the system's own data.");
     add(!holds_zones(layout::system_zoneinfo),

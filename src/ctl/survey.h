@@ -25,6 +25,11 @@ struct dataset {
     bool removable = false; // an update that is not in use
 };
 
+/// What to say of a dataset that is not readable.
+[[nodiscard]] inline std::string why_unreadable(const dataset& data) {
+    return data.version + " is a version with a number beyond 2147483647.";
+}
+
 /// The datasets between which a start decides, as far as they exist.
 struct candidates {
     std::optional<dataset> system;

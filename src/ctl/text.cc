@@ -87,7 +87,8 @@ std::string on_current(verdict found, const dataset& current, const dataset& sys
     case verdict::other_schema: return other_schema(current, system);
     case verdict::not_newer: return name_of(system) + " is newer than " + name_of(current) + ".";
     case verdict::none: return "The current link is missing or names no dataset.";
-    case verdict::failed: return "The current update cannot be read.";
+    case verdict::failed:
+        return current.readable ? "The current update cannot be read." : why_unreadable(current);
     case verdict::unknown: break;
     }
     return "";
@@ -103,7 +104,9 @@ std::string on_latest(verdict found, const dataset& latest, const dataset& curre
         return latest.path == current.path ? "The latest update is the same."
                                            : not_newer(latest, current);
     case verdict::none: return "There is no latest update.";
-    case verdict::failed: return "The latest link names no update that can be read.";
+    case verdict::failed:
+        return latest.readable ? "The latest link names no update that can be read."
+                               : why_unreadable(latest);
     case verdict::unknown: break;
     }
     return "";
