@@ -1,0 +1,146 @@
+#!/usr/bin/env python3
+# SPDX-License-Identifier: BSD-2-Clause
+"""Checks how a program compares the system's zones with an edited copy, against Python's zoneinfo.
+
+usage: zones_test.py PROGRAM
+"""
+import bisect
+import datetime
+import json
+import os
+import pathlib
+import re
+import struct
+import subprocess
+import sys
+import tempfile
+import time
+import zoneinfo
+
+YEAR = time.gmtime().tm_year
+OWN_ZONES = f"""
+Z Own/Abbreviation 1 - [AAA|BBB]
+Z Own/Flag [2 -|1 1] AAA
+Z Own/Week 1 - AAA {YEAR + 3} Jul 1 12:34:56
+[1|2] - AAA {YEAR + 3} Jul 8 12:34:56
+1 - AAA
+""" + "".join(f"""
+Z Own/Day{day} 1 - AAA {YEAR + 9} Jul {day} 0:{day}
+2 - BBB {YEAR + 9} Jul {day + 1} 0:{day}:[1|2]
+3 - CCC
+""" for day in range(1, 15))
+
+
+def small_zone(changes_to=0, rule=b"ABC0"):
+    """A compiled zone with one local type and a change, long ago, to the type of that number."""
+    header = b"TZif2" + bytes(15) + struct.pack(">6I", 0, 0, 0, 1, 1, 4)
+    types = bytes([changes_to]) + struct.pack(">iBB4s", 0, 0, 0, b"ABC")
+    return header + bytes(4) + types + header + bytes(8) + types + b"\n" + rule + b"\n"
+
+
+def link(target):
+    return lambda path: path.symlink_to(target)
+
+
+ZONE = small_zone()
+UNREADABLE = {"text": b"text", "type": small_zone(changes_to=1), "rule": small_zone(rule=b"A"),
+              "large": small_zone(rule=b"ABC0" + b" " * 70000), "outside": link("../../old/UTC"),
+              "circle": link("circle"), "directory": pathlib.Path.mkdir, "fifo": os.mkfifo,
+              **{f"cut at {size}": ZONE[:size] for size in range(len(ZONE))}}
+DEEP = "1/2/3/4/5/6/7/8/9/10/11/12/13/14/15/"
+ODD_FILES = [  # name, what lies there in each directory, where it is reported
+    *((f"odd/{name}", ZONE, odd, "unreadable_after") for name, odd in UNREADABLE.items()),
+    ("odd/before", b"text", ZONE, "unreadable_before"),
+    ("odd/new", None, ZONE[:-1], "unreadable_after"),
+    ("first_version", ZONE, ZONE[:59].replace(b"TZif2", b"TZif\0"), None),
+    ("gone", ZONE, None, "removed"),
+    ("dangling", ZONE, link("nowhere"), "removed"),
+    ("new", None, ZONE, "added"),
+    ("link/up", None, link("../new"), "added"),
+    (DEEP + "16", None, ZONE, "added"),
+    (DEEP + "too/deep", None, ZONE, None),
+    ("+VERSION", b"1", b"2", None),
+    *((name, ZONE, None, None) for name in ("posix/gone", "right/gone", "posixrules")),
+]
+
+
+def lay_out(old, new):
+    text = pathlib.Path("/usr/share/zoneinfo/tzdata.zi").read_text(encoding="utf-8") + OWN_ZONES
+    later = re.sub(r"^(R E \d+ ma - .*) 1u ", r"\1 2u ", text, flags=re.M)  # by an hour, in Europe
+    for top, form, choice, rules in ((old, "fat", r"\1", text), (new, "slim", r"\2", later)):
+        subprocess.run(["zic", "-b", form, "-d", top, "-"], check=True, text=True,
+                       input=re.sub(r"\[(.*)\|(.*)\]", choice, rules),
+                       env={"PATH": os.environ["PATH"] + ":/usr/sbin"})
+    for name, before, after, _ in ODD_FILES:
+        for path, what in ((old / name, before), (new / name, after)):
+            path.parent.mkdir(parents=True, exist_ok=True)
+            if callable(what):
+                what(path)
+            elif what is not None:
+                path.write_bytes(what)
+
+
+def zones(top):
+    """The contents of a directory's zones, by name."""
+    found = {path: path.read_bytes() for path in top.rglob("*") if path.is_file()}
+    return {str(path.relative_to(top)): contents for path, contents in found.items()
+            if contents.startswith(b"TZif")}
+
+
+def local_types(path, start, end):
+    """The local type from each moment on; periods of less than five days may be missing."""
+    with path.open("rb") as file:
+        zone = zoneinfo.ZoneInfo.from_file(file)
+    os.environ["TZ"] = f":{path}"
+    time.tzset()
+
+    def at(moment):
+        local = datetime.datetime.fromtimestamp(moment, zone)
+        return {"offset": int(local.utcoffset().total_seconds()), "abbreviation": local.tzname(),
+                "dst": time.localtime(moment).tm_isdst == 1}  # zoneinfo has no such flag
+
+    found = {start: (now := at(start))}
+    for low in range(start, end - 1, 5 * 86400):
+        high = min(low + 5 * 86400, end - 1)
+        while at(high) != now:
+            low += bisect.bisect_left(range(low, high), True, key=lambda moment: at(moment) != now)
+            found[low] = now = at(low)
+    return found
+
+
+def first_change(zone, old, new):
+    before = after = None
+    for moment in sorted({*old, *new}):
+        before, after = old.get(moment, before), new.get(moment, after)
+        if before != after:
+            return [{"zone": zone, "at": moment, "before": before, "after": after}]
+    return []
+
+
+def main(program):
+    with tempfile.TemporaryDirectory() as work:
+        old, new = pathlib.Path(work, "old"), pathlib.Path(work, "new")
+        lay_out(old, new)
+        output = subprocess.run([program, old, new], stdout=subprocess.PIPE, check=True, timeout=60)
+        found = json.loads(output.stdout)
+        span = found.pop("start"), found.pop("end")
+        expected = {where: sorted(row[0] for row in ODD_FILES if row[3] == where)
+                    for where in ("added", "removed", "unreadable_before", "unreadable_after")}
+        one, other = zones(old), zones(new)
+        both = (one.keys() & other.keys()).difference(*expected.values())
+        expected["compared"] = len(both)
+        known = {}
+        for top, files in ((old, one), (new, other)):
+            for zone in both:
+                if one[zone] != other[zone] and files[zone] not in known:
+                    known[files[zone]] = local_types(top / zone, *span)
+        expected["changed"] = [
+            change for zone in sorted(both) if one[zone] != other[zone]
+            for change in first_change(zone, known[one[zone]], known[other[zone]])]
+        assert len(expected["changed"]) > 40
+    for what, values in expected.items():
+        assert found[what] == values, f"{what}:\nexpected {values}\nfound    {found[what]}"
+    print(f"{len(expected['changed'])} of {expected['compared']} zones change")
+
+
+main(*sys.argv[1:])
