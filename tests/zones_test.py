@@ -1,8 +1,8 @@
 #!/usr/bin/env python3
 # SPDX-License-Identifier: BSD-2-Clause
-"""Checks how a program compares the system's zones with an edited copy, against Python's zoneinfo.
+"""Checks how tzctl compares the system's zones with an edited copy, against Python's zoneinfo.
 
-usage: zones_test.py PROGRAM
+usage: zones_test.py TZCTL
 """
 import bisect
 import datetime
@@ -44,14 +44,15 @@ def link(target):
 
 ZONE = small_zone()
 UNREADABLE = {"text": b"text", "type": small_zone(changes_to=1), "rule": small_zone(rule=b"A"),
-              "large": small_zone(rule=b"ABC0" + b" " * 70000), "outside": link("../../old/UTC"),
-              "circle": link("circle"), "directory": pathlib.Path.mkdir, "fifo": os.mkfifo,
+              "large": small_zone(rule=b"ABC0" + b" " * 70000),
+              "outside": link("../../zoneinfo/UTC"), "circle": link("circle"),
+              "directory": pathlib.Path.mkdir, "fifo": os.mkfifo,
               **{f"cut at {size}": ZONE[:size] for size in range(len(ZONE))}}
 DEEP = "1/2/3/4/5/6/7/8/9/10/11/12/13/14/15/"
 ODD_FILES = [  # name, what lies there in each directory, where it is reported
-    *((f"odd/{name}", ZONE, odd, "unreadable_after") for name, odd in UNREADABLE.items()),
-    ("odd/before", b"text", ZONE, "unreadable_before"),
-    ("odd/new", None, ZONE[:-1], "unreadable_after"),
+    *((f"odd/{name}", ZONE, odd, "unreadable_to") for name, odd in UNREADABLE.items()),
+    ("odd/before", b"text", ZONE, "unreadable_from"),
+    ("odd/new", None, ZONE[:-1], "unreadable_to"),
     ("first_version", ZONE, ZONE[:59].replace(b"TZif2", b"TZif\0"), None),
     ("gone", ZONE, None, "removed"),
     ("dangling", ZONE, link("nowhere"), "removed"),
@@ -117,30 +118,90 @@ def first_change(zone, old, new):
     return []
 
 
+def lay_out_image(image):
+    """An image whose own data differs from that of its latest update."""
+    state, share = image / "var/db/timezone", image / "usr/share"
+    new = state / "tz/2016d"
+    lay_out(share / "zoneinfo.default", new / "zoneinfo")
+    for path, text in ((share / "zoneinfo.default/+VERSION", "2016c"),
+                       (new / "icutz/icutz44l.dat", ""),
+                       (share / "icu/icutzformat.txt", "44l")):
+        path.parent.mkdir(exist_ok=True)
+        path.write_text(text, encoding="utf-8")
+    for path, target in ((state / "zoneinfo", "/usr/share/zoneinfo.default"),
+                         (state / "tz_latest", "/var/db/timezone/tz/2016d"),
+                         (state / "localtime", "/var/db/timezone/zoneinfo/Europe/Paris"),
+                         (image / "etc/localtime", "../var/db/timezone/localtime")):
+        path.parent.mkdir(exist_ok=True)
+        path.symlink_to(target)
+    return share, new
+
+
+def expected_differences(old, new, span):
+    expected = {where: sorted(row[0] for row in ODD_FILES if row[3] == where)
+                for where in ("added", "removed", "unreadable_from", "unreadable_to")}
+    one, other = zones(old), zones(new)
+    both = (one.keys() & other.keys()).difference(*expected.values())
+    expected["compared"] = len(both)
+    known = {}
+    for top, files in ((old, one), (new, other)):
+        for zone in both:
+            if one[zone] != other[zone] and files[zone] not in known:
+                known[files[zone]] = local_types(top / zone, *span)
+    expected["changed"] = [
+        change for zone in sorted(both) if one[zone] != other[zone]
+        for change in first_change(zone, known[one[zone]], known[other[zone]])]
+    assert len(expected["changed"]) > 40
+    return expected
+
+
 def main(program):
     with tempfile.TemporaryDirectory() as work:
-        old, new = pathlib.Path(work, "old"), pathlib.Path(work, "new")
-        lay_out(old, new)
-        output = subprocess.run([program, old, new], stdout=subprocess.PIPE, check=True, timeout=60)
-        found = json.loads(output.stdout)
-        span = found.pop("start"), found.pop("end")
-        expected = {where: sorted(row[0] for row in ODD_FILES if row[3] == where)
-                    for where in ("added", "removed", "unreadable_before", "unreadable_after")}
-        one, other = zones(old), zones(new)
-        both = (one.keys() & other.keys()).difference(*expected.values())
-        expected["compared"] = len(both)
-        known = {}
-        for top, files in ((old, one), (new, other)):
-            for zone in both:
-                if one[zone] != other[zone] and files[zone] not in known:
-                    known[files[zone]] = local_types(top / zone, *span)
-        expected["changed"] = [
-            change for zone in sorted(both) if one[zone] != other[zone]
-            for change in first_change(zone, known[one[zone]], known[other[zone]])]
-        assert len(expected["changed"]) > 40
-    for what, values in expected.items():
-        assert found[what] == values, f"{what}:\nexpected {values}\nfound    {found[what]}"
-    print(f"{len(expected['changed'])} of {expected['compared']} zones change")
+        image = pathlib.Path(work, "image")
+        share, new = lay_out_image(image)
+
+        def tzctl(*words, status=0):
+            done = subprocess.run([program, "--root", image, *words], stdout=subprocess.PIPE,
+                                  stderr=subprocess.STDOUT, check=False, timeout=60, text=True,
+                                  cwd=work)
+            assert done.returncode == status, done
+            return done.stdout
+
+        def differences(*operands):
+            return json.loads(tzctl("diff", "--json", *operands))
+
+        found = differences()
+        expected = expected_differences(share / "zoneinfo.default", new / "zoneinfo",
+                                        (found["start"], found["end"]))
+        expected.update({"format": 1, "from": "2016c.1.0", "to": "2016d",
+                         "local_zone": "Europe/Paris"})
+        for what, values in expected.items():
+            assert found[what] == values, f"{what}:\nexpected {values}\nfound    {found[what]}"
+
+        changed = [change["zone"] for change in found["changed"]]
+        for names, *operands in (("2016c.1.0 2016d", "latest"),
+                                 ("2016c.1.0 2016d", "system", "2016d"),
+                                 ("share zoneinfo", "image/usr/share", f"{new}/zoneinfo/"),
+                                 ("2016d 2016c.1.0", "image/var/db/timezone/tz/2016d", "current")):
+            other = differences(*operands)
+            assert [change["zone"] for change in other["changed"]] == changed, operands
+            assert f"{other['from']} {other['to']}" == names, names
+
+        effect = f"Other zones that change: {len(changed) - 1}.\n"
+        for words, status, text in (
+                (["status"], 0, "Local time, Europe/Paris, changes at "), (["status"], 0, effect),
+                (["diff"], 0, "CET (UTC+01:00) instead of CEST (UTC+02:00, DST)"),
+                (["diff", "./nothing"], 1, "./nothing: No such file"),
+                (["diff", "image/etc"], 1, "image/etc: holds no zone file"),
+                (["diff", "2016z"], 1, "2016z/zoneinfo: No such file"),
+                (["diff", ".."], 1, "..: not a version"),
+                (["diff", "system", "current", "latest"], 2, "latest"),
+                (["use", "2016d"], 0, "Current now"),
+                (["diff"], 0, "Local time, Europe/Paris, does not change.")):
+            output = tzctl(*words, status=status)
+            assert text in output, f"{words}:\n{output}"
+        assert "Local time" not in tzctl(), "nothing changes"
+    print(f"{len(changed)} of {expected['compared']} zones change")
 
 
 main(*sys.argv[1:])

@@ -107,6 +107,23 @@ ordered_json described(const prediction& next, const candidates& linked) {
             {"warnings", texts(next.warnings)}};
 }
 
+ordered_json described(const local_type& type) {
+    return {{"offset", type.offset},
+            {"dst", type.daylight_saving},
+            {"abbreviation", in_utf8(type.abbreviation)}};
+}
+
+ordered_json described(const std::vector<zone_change>& all) {
+    ordered_json array = ordered_json::array();
+    for (const auto& [zone, at, before, after] : all) {
+        array.push_back({{"zone", in_utf8(zone)},
+                         {"at", at},
+                         {"before", described(before)},
+                         {"after", described(after)}});
+    }
+    return array;
+}
+
 } // namespace
 
 void print_as_json(const survey& found) {
@@ -127,6 +144,22 @@ void print_as_json(const survey& found) {
                               {"record", text_or_null(found.record)},
                               {"next_start", described(found.next_start, found.linked)},
                               {"findings", texts(found.findings)}};
+    std::cout << object.dump(2) << '\n';
+}
+
+void print_as_json(const comparison& done) {
+    const ordered_json object{{"format", 1},
+                              {"from", in_utf8(done.from)},
+                              {"to", in_utf8(done.to)},
+                              {"start", done.start},
+                              {"end", done.end},
+                              {"compared", done.found.compared.size()},
+                              {"local_zone", text_or_null(done.local_zone)},
+                              {"changed", described(done.found.changed)},
+                              {"added", texts(done.found.added)},
+                              {"removed", texts(done.found.removed)},
+                              {"unreadable_from", texts(done.found.unreadable_before)},
+                              {"unreadable_to", texts(done.found.unreadable_after)}};
     std::cout << object.dump(2) << '\n';
 }
 

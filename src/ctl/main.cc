@@ -31,6 +31,7 @@ struct command_line {
     std::string root;
     std::string dataset;
     std::string version;
+    std::vector<std::string> compared;
     bool json = false;
     bool forced = false;
     bool rehearsed = false;
@@ -74,6 +75,13 @@ void install(const command_line& given) {
     tz::install(dataset, given.dataset, files::path(whole.get()).filename(), given.forced);
 }
 
+void diff(const command_line& given) {
+    std::vector<tz::operand> operands(given.compared.begin(), given.compared.end());
+    enter_root_if_any(given.root);
+    const auto done = tz::compare(std::move(operands));
+    given.json ? tz::print_as_json(done) : tz::print_for_people(done);
+}
+
 void declare(CLI::App& app, command_line& given) {
     app.set_version_flag("--version", "tzctl " TZCTL_VERSION);
     const auto not_empty = [](const std::string& text) {
@@ -82,11 +90,18 @@ void declare(CLI::App& app, command_line& given) {
     app.add_option("--root", given.root, "Work on the system image in this directory")
         ->check(not_empty);
     app.get_formatter()->column_width(20);
-    app.add_flag("--json", given.json, "Print a JSON object, for programs (status)");
+    app.add_flag("--json", given.json, "Print a JSON object, for programs (status, diff)");
     app.require_subcommand(0, 1);
     app.fallthrough();
 
     app.add_subcommand("status", "Show what is current and what the next start does (default)");
+    auto* const diff = app.add_subcommand("diff", "Show which clocks the next start changes");
+    for (const char* name : {"FROM", "TO"}) {
+        diff->add_option_function<std::string>(
+                name, [&](const std::string& word) { given.compared.push_back(word); },
+                "Version, \"system\", \"current\", \"latest\", or a directory with a slash")
+            ->check(not_empty);
+    }
     auto* const install = app.add_subcommand("install", "Install an update for the next start");
     install->add_option("DATASET", given.dataset, "Directory that tzctl make has made")
         ->required()
@@ -114,9 +129,10 @@ int check(const command_line& given) {
 }
 
 void refuse_combinations(const CLI::App& app, const command_line& given) {
-    const bool prints_json = app.get_subcommands().empty() || app.got_subcommand("status");
+    const bool prints_json =
+        app.get_subcommands().empty() || app.got_subcommand("status") || app.got_subcommand("diff");
     if (given.json && !prints_json) {
-        throw CLI::ValidationError("--json", "only for status");
+        throw CLI::ValidationError("--json", "only for status and diff");
     }
     if (app.got_subcommand("make")) {
         if (!given.root.empty()) {
@@ -125,6 +141,13 @@ void refuse_combinations(const CLI::App& app, const command_line& given) {
         if (app.get_subcommand("make")->remaining_size() != 4) {
             throw CLI::ValidationError("usage", "tzctl make update|system TZDATA ICU DIRECTORY");
         }
+    }
+}
+
+void print_effect_if_any(const char* before) {
+    if (const auto effect = tz::effect_of_next_start()) {
+        std::cout << before;
+        tz::print_effect(*effect);
     }
 }
 
@@ -139,6 +162,11 @@ int run(const CLI::App& app, const command_line& given) {
     }
     if (app.got_subcommand("install")) {
         install(given);
+        print_effect_if_any("");
+        return 0;
+    }
+    if (app.got_subcommand("diff")) {
+        diff(given);
         return 0;
     }
     enter_root_if_any(given.root);
@@ -150,6 +178,7 @@ int run(const CLI::App& app, const command_line& given) {
         tz::print_as_json(tz::look());
     } else {
         tz::print_for_people(tz::look());
+        print_effect_if_any("\n");
     }
     return 0;
 }

@@ -10,6 +10,10 @@ namespace tz {
 /// it in a user namespace. Throws std::system_error.
 void enter_root(const std::string& directory);
 
+/// Goes back to where the caller was, if another root directory was entered. Throws
+/// std::system_error.
+void leave_root();
+
 /// `path`, which is absolute, as the caller types it: with the image in front.
 [[nodiscard]] std::string in_image(const std::string& path);
 

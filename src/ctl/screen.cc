@@ -1,7 +1,12 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #include <algorithm>
+#include <array>
+#include <cstdio>
 #include <cstdlib>
+#include <ctime>
 #include <iostream>
+#include <map>
+#include <utility>
 
 #include <unistd.h>
 
@@ -76,6 +81,58 @@ bool is_usual(const prediction& next, const candidates& linked) {
            linked.latest->path == next.result.dataset;
 }
 
+std::string in_words(const local_type& type) {
+    std::array<char, 32> offset{};
+    const long size = std::labs(type.offset);
+    const int length =
+        std::snprintf(offset.data(), offset.size(), "%c%02ld:%02ld:%02ld",
+                      type.offset < 0 ? '-' : '+', size / 3600, size / 60 % 60, size % 60);
+    const std::string shown(offset.data(), static_cast<std::size_t>(length));
+    return type.abbreviation + " (UTC" + shown.substr(0, size % 60 == 0 ? 6 : 9) +
+           (type.daylight_saving ? ", DST)" : ")");
+}
+
+std::string in_words(const zone_change& change, const comparison& done) {
+    std::array<char, 32> text{"now"};
+    std::tm moment{};
+    if (change.at != done.start) {
+        (void)std::strftime(text.data(), text.size(),
+                            change.at % 60 == 0 ? "%Y-%m-%d %H:%M UTC" : "%Y-%m-%d %H:%M:%S UTC",
+                            ::gmtime_r(&change.at, &moment));
+    }
+    return text.data() + (": " + in_words(change.after)) + " instead of " + in_words(change.before);
+}
+
+std::string list(const std::vector<std::string>& zones) {
+    std::string text;
+    for (const auto& zone : zones) {
+        text += (text.empty() ? "" : ", ") + zone;
+    }
+    return text.empty() ? "none" : text;
+}
+
+// One sentence.
+std::string effect_on_local_time(const comparison& done) {
+    const auto& zones = done.found.compared;
+    if (done.next_local_zone) {
+        return "The next start sets the local-time link to the zone " + *done.next_local_zone + ".";
+    }
+    if (!done.local_zone) {
+        return "Local time: no link names the local zone.";
+    }
+    const std::string subject = "Local time, " + *done.local_zone + ", ";
+    if (!std::binary_search(zones.begin(), zones.end(), *done.local_zone)) {
+        return subject + "cannot be compared: not both datasets have that zone.";
+    }
+    for (const auto& change : done.found.changed) {
+        if (change.zone == *done.local_zone) {
+            return subject + (change.at == done.start ? "changes " : "changes at ") +
+                   in_words(change, done) + ".";
+        }
+    }
+    return subject + "does not change.";
+}
+
 } // namespace
 
 void print_for_people(const survey& found) {
@@ -119,6 +176,39 @@ void print_for_people(const survey& found) {
     for (const auto& line : found.findings) {
         std::cout << coloured(wrapped(line, 2), yellow);
     }
+}
+
+void print_for_people(const comparison& done) {
+    const auto& found = done.found;
+    std::map<std::pair<std::time_t, std::string>, std::vector<std::string>> changes;
+    for (const auto& change : found.changed) {
+        changes[{change.at, in_words(change, done)}].push_back(change.zone);
+    }
+    std::cout << wrapped("From " + done.from + " to " + done.to + ", clocks differ in " +
+                         std::to_string(found.changed.size()) + " of " +
+                         std::to_string(found.compared.size()) + " zones within ten years.")
+              << '\n';
+    for (const auto& [change, zones] : changes) {
+        std::cout << wrapped(change.second, 2) << wrapped(list(zones), 4);
+    }
+    std::cout << (changes.empty() ? "" : "\n")
+              << wrapped("New zones: " + list(found.added) +
+                         ". Removed zones: " + list(found.removed) + ".");
+    for (const auto& [name, zones] : {std::pair(done.from, found.unreadable_before),
+                                      std::pair(done.to, found.unreadable_after)}) {
+        if (!zones.empty()) {
+            std::cout << wrapped("Broken zone files in " + name + ": " + list(zones) + ".");
+        }
+    }
+    std::cout << wrapped(effect_on_local_time(done));
+}
+
+void print_effect(const comparison& done) {
+    const auto others =
+        std::count_if(done.found.changed.begin(), done.found.changed.end(),
+                      [&](const zone_change& change) { return change.zone != done.local_zone; });
+    std::cout << wrapped(effect_on_local_time(done) + " Other zones that change: " +
+                         (others == 0 ? "none" : std::to_string(others)) + ".");
 }
 
 } // namespace tz

@@ -230,7 +230,7 @@ zone_differences compare_zones(const zone_directory& from, const zone_directory&
             }
         }
         if (before.readable && after.readable) {
-            ++found.compared;
+            found.compared.push_back(zone);
             compare(zone, before.types, after.types, found.changed);
         }
         const auto note = [&zone](auto& list, bool applies) {

@@ -27,7 +27,7 @@ struct zone_change {
 
 /// Zones are named by relative paths, such as "Europe/Paris", and sorted by name.
 struct zone_differences {
-    std::size_t compared = 0; // readable zones that both have
+    std::vector<std::string> compared; // readable zones that both have
     std::vector<zone_change> changed;
     std::vector<std::string> added;
     std::vector<std::string> removed;

@@ -1,0 +1,163 @@
+// SPDX-License-Identifier: BSD-2-Clause
+#include "ctl/diff.h"
+
+#include <chrono>
+#include <filesystem>
+#include <iostream>
+
+#include <fcntl.h>
+#include <unistd.h>
+
+#include "ctl/failure.h"
+#include "ctl/interruption.h"
+#include "ctl/readers.h"
+#include "ctl/root.h"
+#include "ctl/survey.h"
+#include "ctl/tree.h"
+#include "ctl/updates.h"
+#include "fs/layout.h"
+
+namespace tz {
+namespace {
+
+namespace files = std::filesystem;
+
+constexpr std::time_t ten_years = std::time_t{3652} * 24 * 60 * 60;
+
+// A line on the terminal, if there is one, once the comparison takes longer than a second.
+class progress_line {
+  public:
+    progress_line() = default;
+    progress_line(const progress_line&) = delete;
+    progress_line& operator=(const progress_line&) = delete;
+    ~progress_line() { std::cerr << (printed_ ? "\r\x1b[K" : ""); }
+
+    void print(std::size_t done, std::size_t all) {
+        interruption::check();
+        if (is_terminal_ && done % 16 == 0 && clock::now() - begin_ > std::chrono::seconds(1)) {
+            printed_ = true;
+            std::cerr << "\rCompared " << done << " of " << all << " zones";
+        }
+    }
+
+  private:
+    using clock = std::chrono::steady_clock;
+    clock::time_point begin_ = clock::now();
+    bool is_terminal_ = ::isatty(STDERR_FILENO) == 1;
+    bool printed_ = false;
+};
+
+dataset_zones open_zones(const std::string& name, const std::string& path) {
+    fs::descriptor directory(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    check(directory.number(), in_image(path));
+    if (!tree::holds_zones(directory, in_image(path))) {
+        refuse(in_image(path), "holds no zone file");
+    }
+    return {name, in_image(path), std::move(directory)};
+}
+
+dataset_zones open_zones_in(const std::string& directory) {
+    std::error_code failure;
+    const std::string name = files::canonical(directory, failure).filename();
+    for (const std::string inside : {"/zoneinfo.default", "/zoneinfo"}) {
+        if (files::is_directory(directory + inside, failure)) {
+            return open_zones(name, directory + inside);
+        }
+    }
+    return open_zones(name, directory);
+}
+
+dataset_zones open_zones_of(const std::string& path, const candidates& linked) {
+    return path.empty() ? open_zones(linked.system ? linked.system->version : "system",
+                                     layout::system_zoneinfo)
+                        : open_zones(path.substr(updates::path_of("").size()),
+                                     path + layout::update_zoneinfo);
+}
+
+dataset_zones open_linked(const std::optional<dataset>& named, const char* link,
+                          const candidates& linked) {
+    if (!named) {
+        refuse(in_image(link), "names no dataset");
+    }
+    return open_zones_of(named->path, linked);
+}
+
+dataset_zones open_operand(operand& wanted, const candidates& linked) {
+    if (wanted.opened) {
+        return *std::move(wanted.opened);
+    }
+    if (wanted.text == "current") {
+        return open_linked(linked.current, layout::zoneinfo_link, linked);
+    }
+    if (wanted.text == "latest") {
+        return open_linked(linked.latest, layout::latest_link, linked);
+    }
+    if (wanted.text != "system" && !split_version(wanted.text)) {
+        refuse(wanted.text, "not a version such as 2016b.1.0");
+    }
+    return open_zones_of(wanted.text == "system" ? "" : updates::path_of(wanted.text), linked);
+}
+
+comparison compare(const dataset_zones& from, const dataset_zones& to) {
+    const std::time_t now = std::time(nullptr);
+    comparison done{from.name, to.name, now, now + ten_years, local_zone(), {}, {}};
+    leave_root();
+    progress_line line;
+    done.found =
+        compare_zones({from.directory.number(), from.path}, {to.directory.number(), to.path},
+                      done.start, done.end, [&](auto zones, auto all) { line.print(zones, all); });
+    return done;
+}
+
+// The zone of the local-time link, if the start replaces that by a link to another zone.
+std::optional<std::string> next_local_zone(const prediction& start) {
+    const auto zone = zone_in(start.localtime.value_or(""));
+    const auto now = zone_in(updates::target_of(layout::localtime_link).value_or(""));
+    return zone == now ? std::nullopt : zone;
+}
+
+comparison compare_with_next(const candidates& linked, const prediction& start) {
+    if (start.result.decided == decision::fail) {
+        refuse("the next start", "fails");
+    }
+    const auto zone = next_local_zone(start);
+    auto done = compare(open_linked(linked.current, layout::zoneinfo_link, linked),
+                        open_zones_of(start.result.dataset, linked));
+    done.next_local_zone = zone;
+    return done;
+}
+
+} // namespace
+
+operand::operand(const std::string& word) : text(word) {
+    if (word.find('/') != std::string::npos) {
+        opened = open_zones_in(word);
+    }
+}
+
+comparison compare(std::vector<operand> operands) {
+    imagination::session imagined;
+    const candidates linked = look_at_candidates();
+    imagined.check();
+    if (operands.empty()) {
+        return compare_with_next(linked, predict_start(imagined));
+    }
+    const auto from = operands.size() == 1
+                          ? open_linked(linked.current, layout::zoneinfo_link, linked)
+                          : open_operand(operands.front(), linked);
+    return compare(from, open_operand(operands.back(), linked));
+}
+
+std::optional<comparison> effect_of_next_start() try {
+    imagination::session imagined;
+    const candidates linked = look_at_candidates();
+    const prediction start = predict_start(imagined);
+    if (linked.current && linked.current->path == start.result.dataset) {
+        return std::nullopt;
+    }
+    return compare_with_next(linked, start);
+} catch (const std::exception&) {
+    return std::nullopt;
+}
+
+} // namespace tz

@@ -1,0 +1,51 @@
+// SPDX-License-Identifier: BSD-2-Clause
+#pragma once
+
+#include <ctime>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "ctl/zones.h"
+#include "fs/descriptor.h"
+
+namespace tz {
+
+/// The compiled zones of a dataset, opened for a comparison.
+struct dataset_zones {
+    std::string name; // of the dataset: its version, or a directory's base name
+    std::string path; // as the caller types it
+    fs::descriptor directory;
+};
+
+/// What the caller wants compared: "system", "current", "latest", the version of an installed
+/// update, or a directory, which is what has a slash.
+struct operand {
+    /// Opens a directory where the caller sees it, so before any other root directory is entered.
+    /// It holds an update, the system's own data, or zones themselves. Throws std::exception.
+    explicit operand(const std::string& word);
+
+    std::string text;
+    std::optional<dataset_zones> opened;
+};
+
+struct comparison {
+    std::string from;
+    std::string to;
+    std::time_t start = 0; // inclusive
+    std::time_t end = 0;   // exclusive
+    std::optional<std::string> local_zone;
+    std::optional<std::string> next_local_zone; // if the next start sets another
+    zone_differences found;
+};
+
+/// Compares two datasets from now on, for ten years: the current one and what the next start makes
+/// current; or the current one and the operand; or both operands. Leaves the image, as only outside
+/// of it there is a "/proc". Throws std::exception.
+[[nodiscard]] comparison compare(std::vector<operand> operands);
+
+/// What the next start means for clocks. Nothing if it changes no data, or if that cannot be told.
+/// Leaves the image, too.
+[[nodiscard]] std::optional<comparison> effect_of_next_start();
+
+} // namespace tz
