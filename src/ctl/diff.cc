@@ -47,7 +47,7 @@ class progress_line {
     bool printed_ = false;
 };
 
-dataset_zones open_zones(const std::string& name, const std::string& path) {
+zone_directory open_zones(const std::string& name, const std::string& path) {
     fs::descriptor directory(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     check(directory.number(), in_image(path));
     if (!tree::holds_zones(directory, in_image(path))) {
@@ -56,7 +56,7 @@ dataset_zones open_zones(const std::string& name, const std::string& path) {
     return {name, in_image(path), std::move(directory)};
 }
 
-dataset_zones open_zones_in(const std::string& directory) {
+zone_directory open_zones_in(const std::string& directory) {
     std::error_code failure;
     const std::string name = files::canonical(directory, failure).filename();
     for (const std::string inside : {"/zoneinfo.default", "/zoneinfo"}) {
@@ -67,22 +67,22 @@ dataset_zones open_zones_in(const std::string& directory) {
     return open_zones(name, directory);
 }
 
-dataset_zones open_zones_of(const std::string& path, const candidates& linked) {
+zone_directory open_zones_of(const std::string& path, const candidates& linked) {
     return path.empty() ? open_zones(linked.system ? linked.system->version : "system",
                                      layout::system_zoneinfo)
                         : open_zones(path.substr(updates::path_of("").size()),
                                      path + layout::update_zoneinfo);
 }
 
-dataset_zones open_linked(const std::optional<dataset>& named, const char* link,
-                          const candidates& linked) {
+zone_directory open_linked(const std::optional<dataset>& named, const char* link,
+                           const candidates& linked) {
     if (!named) {
         refuse(in_image(link), "names no dataset");
     }
     return open_zones_of(named->path, linked);
 }
 
-dataset_zones open_operand(operand& wanted, const candidates& linked) {
+zone_directory open_operand(operand& wanted, const candidates& linked) {
     if (wanted.opened) {
         return *std::move(wanted.opened);
     }
@@ -98,14 +98,13 @@ dataset_zones open_operand(operand& wanted, const candidates& linked) {
     return open_zones_of(wanted.text == "system" ? "" : updates::path_of(wanted.text), linked);
 }
 
-comparison compare(const dataset_zones& from, const dataset_zones& to) {
+comparison compare(const zone_directory& from, const zone_directory& to) {
     const std::time_t now = std::time(nullptr);
     comparison done{from.name, to.name, now, now + ten_years, local_zone(), {}, {}};
     leave_root();
     progress_line line;
-    done.found =
-        compare_zones({from.directory.number(), from.path}, {to.directory.number(), to.path},
-                      done.start, done.end, [&](auto zones, auto all) { line.print(zones, all); });
+    done.found = compare_zones(from, to, done.start, done.end,
+                               [&](auto zones, auto all) { line.print(zones, all); });
     return done;
 }
 

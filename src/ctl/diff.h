@@ -7,16 +7,8 @@
 #include <vector>
 
 #include "ctl/zones.h"
-#include "fs/descriptor.h"
 
 namespace tz {
-
-/// The compiled zones of a dataset, opened for a comparison.
-struct dataset_zones {
-    std::string name; // of the dataset: its version, or a directory's base name
-    std::string path; // as the caller types it
-    fs::descriptor directory;
-};
 
 /// What the caller wants compared: "system", "current", "latest", the version of an installed
 /// update, or a directory, which is what has a slash.
@@ -26,7 +18,7 @@ struct operand {
     explicit operand(const std::string& word);
 
     std::string text;
-    std::optional<dataset_zones> opened;
+    std::optional<zone_directory> opened;
 };
 
 struct comparison {

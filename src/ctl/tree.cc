@@ -151,7 +151,7 @@ void copy_item(const item& entry, int copy, const std::string& shown) {
 void check_links(const fs::descriptor& copy, const std::string& shown) {
     (void)walk(copy, shown, [&](const item& entry) {
         if (S_ISLNK(entry.status.st_mode) &&
-            !kernel::leads_to_something_beneath(copy.number(), entry.path)) {
+            !fs::descriptor(kernel::open_beneath(copy.number(), entry.path)).is_open()) {
             refuse(shown + "/" + entry.path,
                    "a symbolic link that leads out of the dataset or nowhere");
         }
@@ -206,6 +206,17 @@ bool has_everything_of(const fs::descriptor& one, const fs::descriptor& other,
     return !walk(one, shown, [&](const item& entry) {
         interruption::check();
         return is_equal(entry, other, shown + "/" + entry.path) ? next::descend : next::stop;
+    });
+}
+
+// Visits what is no directory where programs look for zones, until a visit returns true.
+bool walk_zones(const fs::descriptor& zoneinfo, const std::string& shown,
+                const std::function<bool(const item&)>& visit) {
+    return walk(zoneinfo, shown, [&](const item& entry) {
+        return S_ISDIR(entry.status.st_mode)
+                   ? (entry.path == "posix" || entry.path == "right" ? next::skip : next::descend)
+               : visit(entry) ? next::stop
+                              : next::descend;
     });
 }
 
@@ -324,12 +335,17 @@ bool is_zone(int directory, const std::string& name, const std::string& shown) {
 }
 
 bool holds_zones(const fs::descriptor& zoneinfo, const std::string& shown) {
-    return walk(zoneinfo, shown, [&](const item& entry) {
-        if (S_ISREG(entry.status.st_mode) &&
-            is_zone(entry.directory, entry.name, shown + "/" + entry.path)) {
-            return next::stop;
-        }
-        return entry.path == "posix" || entry.path == "right" ? next::skip : next::descend;
+    return walk_zones(zoneinfo, shown, [&](const item& entry) {
+        return S_ISREG(entry.status.st_mode) &&
+               is_zone(entry.directory, entry.name, shown + "/" + entry.path);
+    });
+}
+
+void for_each_zone_name(const fs::descriptor& zoneinfo, const std::string& shown,
+                        const std::function<void(const std::string&)>& act) {
+    (void)walk_zones(zoneinfo, shown, [&](const item& entry) {
+        act(entry.path);
+        return false;
     });
 }
 

@@ -40,6 +40,10 @@ void copy(const fs::descriptor& source, const fs::descriptor& copy, const std::s
 /// looks for a zone.
 [[nodiscard]] bool holds_zones(const fs::descriptor& zoneinfo, const std::string& shown);
 
+/// Calls `act` with the path of everything else than a directory, there, too.
+void for_each_zone_name(const fs::descriptor& zoneinfo, const std::string& shown,
+                        const std::function<void(const std::string&)>& act);
+
 /// The number of bytes on the disk that removing everything below `directory` frees.
 [[nodiscard]] double size(const fs::descriptor& directory, const std::string& shown);
 

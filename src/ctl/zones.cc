@@ -5,22 +5,20 @@
 #include <cstdint>
 #include <cstdlib>
 #include <cstring>
-#include <filesystem>
 #include <map>
 #include <optional>
 #include <set>
-#include <stdexcept>
 
 #include <endian.h>
 #include <fcntl.h>
-#include <linux/openat2.h>
 #include <sys/mman.h>
 #include <sys/stat.h>
-#include <sys/syscall.h>
 #include <unistd.h>
 
 #include "ctl/failure.h"
+#include "ctl/tree.h"
 #include "fs/descriptor.h"
+#include "rehearsal/kernel.h"
 
 namespace tz {
 namespace {
@@ -29,7 +27,6 @@ constexpr std::time_t half_a_week = 302400;
 constexpr off_t largest_file =
     65536; // ten times the largest zone; the C library is slow with large files
 constexpr std::size_t most_files = 65536;
-constexpr int most_levels = 16;
 
 using timeline = std::map<std::time_t, local_type>; // what a clock shows from each moment on
 
@@ -45,37 +42,14 @@ std::string own_path(int descriptor) {
 }
 
 void add_names(const zone_directory& top, std::set<std::string>& names) {
-    const std::string root = own_path(top.descriptor) + "/";
-    std::string name;
-    std::error_code failure;
-    std::filesystem::recursive_directory_iterator entry(root, failure);
-    for (; !failure && entry != end(entry); entry.increment(failure)) {
-        name = entry->path().native().substr(root.size());
-        std::error_code gone;
-        const bool passed_over = name == "posix" || name == "right" || name == "posixrules";
-        if (passed_over || entry.depth() + 1 == most_levels) {
-            entry.disable_recursion_pending();
-        }
-        if (!passed_over && !is_directory(entry->symlink_status(gone))) {
+    tree::for_each_zone_name(top.descriptor, top.path, [&](const std::string& name) {
+        if (name != "posixrules") {
             names.insert(name);
         }
         if (names.size() > most_files) {
-            throw std::runtime_error(top.path + ": too many files");
+            refuse(top.path, "too many files");
         }
-    }
-    if (failure) {
-        throw std::system_error(failure, top.path + "/" + name);
-    }
-}
-
-// Opens what lies at a name with O_PATH. A link that leads out of the directory fails with EXDEV.
-int open_beneath(const zone_directory& top, const std::string& name) {
-    open_how how{O_PATH | O_CLOEXEC, 0, RESOLVE_BENEATH | RESOLVE_NO_MAGICLINKS};
-    long opened = -1;
-    do { // EAGAIN: a rename anywhere while the kernel resolves ".."
-        opened = ::syscall(SYS_openat2, top.descriptor, name.c_str(), &how, sizeof how);
-    } while (opened == -1 && errno == EAGAIN);
-    return static_cast<int>(opened);
+    });
 }
 
 // Whether the file holds all that its headers count, and the last line. Of a truncated file, glibc
@@ -102,7 +76,7 @@ bool is_whole(const std::string& file) {
 
 zone_file look_at(const zone_directory& top, const std::string& name) {
     const std::string path = top.path + "/" + name;
-    const fs::descriptor place(open_beneath(top, name));
+    const fs::descriptor place(kernel::open_beneath(top.descriptor.number(), name));
     const int failure = place.is_open() ? 0 : errno;
     zone_file found{failure != ENOENT && failure != ENOTDIR};
     if (!found.exists || failure == EXDEV || failure == ELOOP) {
@@ -157,6 +131,7 @@ class zone_reader {
   public:
     zone_reader() : copy_(::memfd_create("zone", MFD_CLOEXEC)), path_(own_path(copy_.number())) {
         check(copy_.number(), "cannot copy a file to memory");
+        check(::access(path_.c_str(), R_OK), path_); // or every zone would be UTC
         if (const char* own = ::getenv("TZ")) {
             own_zone_ = own;
         }

@@ -6,6 +6,8 @@
 #include <string>
 #include <vector>
 
+#include "fs/descriptor.h"
+
 namespace tz {
 
 /// What a clock shows beside the time of day, for example {3600, false, "CET"}.
@@ -37,10 +39,11 @@ struct zone_differences {
     std::vector<std::string> unreadable_after;
 };
 
-/// An open directory of compiled zones; O_PATH suffices. Error messages begin with `path`.
+/// The compiled zones of a dataset, opened for a comparison.
 struct zone_directory {
-    int descriptor = -1;
-    std::string path;
+    std::string name; // of the dataset: its version, or a directory's base name
+    std::string path; // as the caller types it
+    fs::descriptor descriptor;
 };
 
 using zone_progress = std::function<void(std::size_t done, std::size_t all)>;
@@ -49,8 +52,8 @@ using zone_progress = std::function<void(std::size_t done, std::size_t all)>;
 /// The first disagreement is exact to the second. It goes unnoticed only within a period of less
 /// than half a week, after which a dataset returns to the same local type.
 ///
-/// Zones are regular files that begin with "TZif", at most 16 levels deep, and symbolic links to
-/// such files that stay inside the directory; except "posix", "right" and "posixrules".
+/// Zones are regular files that begin with "TZif", at most 8 directories deep, and symbolic links
+/// to such files that stay inside the directory; except "posix", "right" and "posixrules".
 ///
 /// Calls `progress` before each file, and passes on what that throws. Needs "/proc". Restores the
 /// environment variable TZ. Throws std::system_error with the path of what cannot be read, and

@@ -73,8 +73,12 @@ int open_directory_on_same_mount(int directory, const std::string& name) {
     return child.release();
 }
 
-bool leads_to_something_beneath(int directory, const std::string& path) {
-    return fs::descriptor(open(directory, path, O_PATH | O_CLOEXEC, RESOLVE_BENEATH)).is_open();
+int open_beneath(int directory, const std::string& path) {
+    int opened = -1;
+    do { // EAGAIN: something was renamed while the kernel resolved ".."
+        opened = open(directory, path, O_PATH | O_CLOEXEC, RESOLVE_BENEATH);
+    } while (opened == -1 && errno == EAGAIN);
+    return opened;
 }
 
 int exchange(int directory, const std::string& one, const std::string& other) {

@@ -16,9 +16,9 @@ namespace tz::kernel {
 /// kernel before 5.6 takes only a mount point of another file system for one.
 [[nodiscard]] int open_directory_on_same_mount(int directory, const std::string& name);
 
-/// Whether `path`, if symbolic links are followed, leads to something beneath `directory`. No
-/// kernel before 5.6 can tell, so it does not there.
-[[nodiscard]] bool leads_to_something_beneath(int directory, const std::string& path);
+/// Opens with O_PATH what `path`, if symbolic links are followed, leads to beneath `directory`, but
+/// nothing else (EXDEV). No kernel before 5.6 can do that (ENOSYS).
+[[nodiscard]] int open_beneath(int directory, const std::string& path);
 
 /// Exchanges two entries of `directory`, of any types, in one step.
 int exchange(int directory, const std::string& one, const std::string& other);
