@@ -24,28 +24,23 @@ namespace files = std::filesystem;
 
 constexpr std::time_t ten_years = std::time_t{3652} * 24 * 60 * 60;
 
-// A line on the terminal, if there is one, once the comparison takes longer than a second.
-class progress_line {
-  public:
-    progress_line() = default;
-    progress_line(const progress_line&) = delete;
-    progress_line& operator=(const progress_line&) = delete;
-    ~progress_line() { std::cerr << (printed_ ? "\r\x1b[K" : ""); }
-
-    void print(std::size_t done, std::size_t all) {
-        interruption::check();
-        if (is_terminal_ && done % 16 == 0 && clock::now() - begin_ > std::chrono::seconds(1)) {
-            printed_ = true;
-            std::cerr << "\rCompared " << done << " of " << all << " zones";
-        }
-    }
-
-  private:
+// Compares, with a line on the terminal, if there is one, once it takes longer than a second.
+zone_differences compare_visibly(const zone_directory& from, const zone_directory& to,
+                                 std::time_t start, std::time_t end) {
     using clock = std::chrono::steady_clock;
-    clock::time_point begin_ = clock::now();
-    bool is_terminal_ = ::isatty(STDERR_FILENO) == 1;
-    bool printed_ = false;
-};
+    const auto begin = clock::now();
+    const bool terminal = ::isatty(STDERR_FILENO) == 1;
+    bool printed = false;
+    auto found = compare_zones(from, to, start, end, [&](auto done, auto all) {
+        interruption::check();
+        if (terminal && done % 16 == 0 && clock::now() - begin > std::chrono::seconds(1)) {
+            printed = true;
+            std::cerr << "Compared " << done << " of " << all << " zones\r"; // and over it the next
+        }
+    });
+    std::cerr << (printed ? "\x1b[K" : "");
+    return found;
+}
 
 zone_directory open_zones(const std::string& name, const std::string& path) {
     fs::descriptor directory(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
@@ -102,9 +97,7 @@ comparison compare(const zone_directory& from, const zone_directory& to) {
     const std::time_t now = std::time(nullptr);
     comparison done{from.name, to.name, now, now + ten_years, local_zone(), {}, {}};
     leave_root();
-    progress_line line;
-    done.found = compare_zones(from, to, done.start, done.end,
-                               [&](auto zones, auto all) { line.print(zones, all); });
+    done.found = compare_visibly(from, to, done.start, done.end);
     return done;
 }
 

@@ -6,7 +6,6 @@
 #include <cstdlib>
 #include <cstring>
 #include <map>
-#include <optional>
 #include <set>
 
 #include <endian.h>
@@ -132,15 +131,6 @@ class zone_reader {
     zone_reader() : copy_(::memfd_create("zone", MFD_CLOEXEC)), path_(own_path(copy_.number())) {
         check(copy_.number(), "cannot copy a file to memory");
         check(::access(path_.c_str(), R_OK), path_); // or every zone would be UTC
-        if (const char* own = ::getenv("TZ")) {
-            own_zone_ = own;
-        }
-    }
-    zone_reader(const zone_reader&) = delete;
-    zone_reader& operator=(const zone_reader&) = delete;
-    ~zone_reader() {
-        (void)(own_zone_ ? ::setenv("TZ", own_zone_->c_str(), 1) : ::unsetenv("TZ"));
-        ::tzset();
     }
 
     // Sets the types. If the C library refuses the file, or its last line, clocks show UTC with an
@@ -165,7 +155,6 @@ class zone_reader {
 
     fs::descriptor copy_;
     std::string path_;
-    std::optional<std::string> own_zone_;
 };
 
 void compare(const std::string& zone, const timeline& before, const timeline& after,

@@ -55,8 +55,8 @@ using zone_progress = std::function<void(std::size_t done, std::size_t all)>;
 /// Zones are regular files that begin with "TZif", at most 8 directories deep, and symbolic links
 /// to such files that stay inside the directory; except "posix", "right" and "posixrules".
 ///
-/// Calls `progress` before each file, and passes on what that throws. Needs "/proc". Restores the
-/// environment variable TZ. Throws std::system_error with the path of what cannot be read, and
+/// Calls `progress` before each file, and passes on what that throws. Needs "/proc". Changes
+/// the environment variable TZ. Throws std::system_error with the path of what cannot be read, and
 /// std::runtime_error if the two directories hold more than 65536 names.
 [[nodiscard]] zone_differences compare_zones(const zone_directory& from, const zone_directory& to,
                                              std::time_t start, std::time_t end,
