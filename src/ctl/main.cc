@@ -99,7 +99,7 @@ void declare(CLI::App& app, command_line& given) {
     for (const char* name : {"FROM", "TO"}) {
         diff->add_option_function<std::string>(
                 name, [&](const std::string& word) { given.compared.push_back(word); },
-                "Version, \"system\", \"current\", \"latest\", or a directory with a slash")
+                "A version, system, current, latest, or a directory with a slash")
             ->check(not_empty);
     }
     auto* const install = app.add_subcommand("install", "Install an update for the next start");

@@ -122,7 +122,7 @@ std::string effect_on_local_time(const comparison& done) {
     }
     const std::string subject = "Local time, " + *done.local_zone + ", ";
     if (!std::binary_search(zones.begin(), zones.end(), *done.local_zone)) {
-        return subject + "cannot be compared: not both datasets have that zone.";
+        return subject + "cannot be compared: a dataset lacks a valid file of it.";
     }
     for (const auto& change : done.found.changed) {
         if (change.zone == *done.local_zone) {
