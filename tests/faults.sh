@@ -3,16 +3,27 @@
 # usage: faults.sh BUILD-DIRECTORY "START..." DISTURBANCE...
 # Disturbs every system call of each START in turn, as strace's option "inject" says it: the call
 # fails, or the program is killed on its way in. The verbs "install", "use" and "cleanup" of
-# tzctl are disturbed like a start. The root holds only the static programs and data.
+# tzctl are disturbed like a start.
 set -euo pipefail
 PATH=$PATH:/usr/sbin:/sbin # where chroot is, for an ordinary user
-[ "$(id -u)" -eq 0 ] || exec unshare --map-root-user "$0" "$@"
+if [ "$(id -u)" -ne 0 ]; then
+    echo "Not root, so this needs user namespaces, which a chroot does not allow." >&2
+    exec unshare --map-root-user "$0" "$@"
+fi
+export ASAN_OPTIONS=detect_leaks=0 # which cannot be done under strace
+build=$(realpath "$1")
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
-mkdir "$work/root"
-cp "$1"/tzreconcile "$1"/tzctl "$work/root"
 cd "$work"
 disturbances=("${3?}" "${@:4}")
+mkdir root
+untouched=none
+tzreconcile=(chroot root /tzreconcile)
+if [ -x "$build/tests/tzreconcile" ]; then # the program is not static
+    tzreconcile=("$build/tests/tzreconcile" root)
+    untouched=mmap # as the sanitizers need that themselves
+fi
+tzctl=("$build/tzctl" --root root)
 
 declare -A starts=( # the links that each finds
     [use]="zoneinfo=@2016d/zoneinfo icutz=@2016d/icutz tz_latest=@2016d"
@@ -29,30 +40,34 @@ fail() {
     exit 1
 }
 
-put_back() {
+put_back() { # STATE
     rm -rf root/var
-    cp -a given root/var
+    cp -a "$1" root/var
 }
 
 run() { # OPTION-OF-STRACE COMMAND...
-    put_back
+    put_back given
     status=0
-    { strace -o calls -e "$1" chroot root "${@:2}" >/dev/null 2>said || status=$?; } 2>killed
+    { strace -o calls -e "$1" "${@:2}" >/dev/null 2>said || status=$?; } 2>killed
 }
 
 disturb_every_call() { # CHECK-OF-WHAT-IS-LEFT COMMAND...
     run trace=%file,%desc,%signal "${@:2}"
-    # What follows the COMMAND's execve, numbered among all calls of the same name.
-    awk -F '(' -v program="\"$2\"," '
+    # Those from the first of main on, numbered among all calls of the same name.
+    awk -F '(' -v untouched=$untouched '
         { number[$1]++ }
-        started && /^[a-z]/ { print $1 ":when=" number[$1] }
-        $1 == "execve" && index($2, program) == 1 { started = 1 }' calls >in_turn
+        /^fcntl\(0, F_GETFD/ { started = 1 }
+        started && /^[a-z]/ && $1 != untouched { print $1 ":when=" number[$1] }' calls >in_turn
+    [ -s in_turn ] || fail "runs no call"
     local call disturbance
     for call in $(<in_turn) "?unlink,?symlink,unlinkat,symlinkat"; do # and all of these at once
         for disturbance in "${disturbances[@]}"; do
             run "inject=$call:$disturbance" "${@:2}"
-            { [ -s in_turn ] && grep -q 'INJECTED)$\|killed by SIGKILL' calls && "$1"; } ||
+            if ! grep -q 'INJECTED)$\|killed by SIGKILL' calls; then
+                [[ $call == \?* ]] || fail "does not get to $call"
+            elif ! "$1"; then
                 fail "not $1 with $call:$disturbance, status $status: $(<said)"
+            fi
         done
     done
     echo "$start: $(wc -l <in_turn) calls"
@@ -72,34 +87,58 @@ survived() {
     *) [ "$status" -eq 137 ] ;;
     esac &&
         { usable root/var || ! usable given || tail -n 2 calls | grep -q '^symlink.*/zoneinfo"'; } &&
-        chroot root /tzreconcile 2>said && usable root/var
+        "${tzreconcile[@]}" 2>said && usable root/var
 }
 
 disturb_start() {
-    disturb_every_call survived /tzreconcile
+    cp "$build/tzreconcile" root
+    disturb_every_call survived "${tzreconcile[@]}"
 
-    run trace=none /tzreconcile
+    run trace=none "${tzreconcile[@]}"
     rm -rf after && mv root/var after
-    put_back # Nobody reads the warnings, files must stay empty, few may be open.
-    { (ulimit -f 0 -n 5 && sleep 0.1 && exec chroot root /tzreconcile) <&- 2>&1 >&- 3>&- 4>&- | : &&
+    put_back given # Nobody reads the warnings, files must stay empty, few may be open.
+    { (ulimit -f 0 -n 5 && sleep 0.1 && exec "${tzreconcile[@]}") <&- 2>&1 >&- 3>&- 4>&- | : &&
         diff -r --no-dereference -x TZVersionDiffRecord after root/var; } || fail "hampered"
 }
 
-# All or nothing: the links are as before or as after, the data that they name is there, and every
-# update is whole. Only a death may leave what the next one deletes.
+is_like() { # STATE WHAT-DOES-NOT-COUNT
+    diff -r --no-dereference -x "${2-.tzctl.lock}" "$1" root/var >>said
+}
+
+# A failure leaves the links as they were. After a death, too, every update is whole, and the next
+# tzctl completes what was begun, and clears up what was left.
 done_or_not() {
-    local var=root/var/db/timezone update expected
-    [ "$status" -ne 137 ] || rm -rf $var/tz/.tzctl $var/*.tzctl-*
-    for update in "$var"/tz/*; do diff -r "$update" "whole/${update##*/}" || return; done
-    for expected in given after; do
-        ! diff -r --no-dereference $expected root/var | grep -qv '/tz: 2016[af]$' && break
-    done && usable root/var && [ -e "root$(readlink $var/tz_latest)/zoneinfo" ]
+    case $status in
+    0) is_like after '.tzctl.*' ;;
+    1) is_like given '.tzctl.*' || { [[ $call$start =~ ^write|cleanup ]] && is_like after '.tzctl.*'; } ;;
+    *) [ "$status" -eq 137 ] ;;
+    esac && usable root/var || return
+    local found update
+    found=$(find root/var -printf '%P %y %s %l\n' | sed 's/tzctl\.[0-9a-f]*//' | sort)
+    if [ -z "${mended[$found]-}" ]; then
+        for update in root/var/db/timezone/tz/*; do
+            diff -r "$update" "whole/${update##*/}" >>said || return
+        done
+        rm -rf left && cp -a root/var left
+        "${verb[@]}" >/dev/null 2>said && is_like after || return
+        put_back left
+        "${tzctl[@]}" cleanup >/dev/null 2>said &&
+            { is_like given_clean || is_like after_clean; } || return
+        mended[$found]=yes
+    fi
 }
 
 disturb_tzctl() { # VERB...
-    run trace=none /tzctl "$@"
+    verb=("${tzctl[@]}" "$@")
+    declare -A mended=() # what has been found and mended before
+    local state
+    run trace=none "${verb[@]}"
     rm -rf after && cp -a root/var after
-    disturb_every_call done_or_not /tzctl "$@"
+    for state in given after; do
+        put_back $state && "${tzctl[@]}" cleanup >/dev/null
+        rm -rf ${state}_clean && mv root/var ${state}_clean
+    done
+    disturb_every_call done_or_not "${verb[@]}"
 }
 
 mkdir -p root/usr/share/{icu,zoneinfo.default} var/db/timezone/tz/2016{a,d,e}/{icutz,zoneinfo}
@@ -111,7 +150,7 @@ for update in 2016a 2016d 2016e; do
 done
 cp -a var/db/timezone/tz whole
 cp -a whole/2016e whole/2016f
-cp -a whole/2016f root
+cp -a whole/2016f .
 for start in $2; do
     rm -rf given
     cp -a var given
@@ -120,7 +159,7 @@ for start in $2; do
         ln -s "${target/@//var/db/timezone/tz/}" "given/db/timezone/${link%%=*}"
     done
     case $start in
-    install) disturb_tzctl install /2016f ;;
+    install) disturb_tzctl install 2016f ;;
     use) disturb_tzctl use 2016e ;;
     cleanup) disturb_tzctl cleanup ;;
     *) disturb_start ;;

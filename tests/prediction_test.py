@@ -4,11 +4,13 @@
 
 usage: prediction_test.py BUILD-DIRECTORY [STATES [SEED]]
 
-All happens in a root directory of its own, in which the programs are all that runs.
+The states are laid out in a root directory of its own, which this process enters and its programs
+leave again: tzctl looks at it from outside.
 """
 import json
 import os
 import random
+import re
 import shutil
 import subprocess
 import sys
@@ -19,18 +21,19 @@ updates = ["2016a", "2016b.1", "2016c.1.0", "2016d", "2016e.1.0", "x", "99999999
 
 # What may lie at a path: None for nothing, "->" and a link's target, "=" and a file's text, "/" for
 # a directory, "/x" for one that is not empty, "|" for a FIFO, "-" for a file that only root may
-# read. In a target "@" is the directory of some update, "~/" the state directory.
-oddities = [None, "=", "/", "/x", "|", "->nowhere", "->/", "->~/zoneinfo", "->~/localtime"]
+# read. In a target "@" is the directory of some update, "~/" the state directory, "?" a few bytes.
+oddities = [None, "=", "/", "/x", "|", "->nowhere", "->?", "->/", "->~/zoneinfo", "->~/localtime"]
 menu = {
     system + "/+VERSION": ["=2016c"] * 20 + ["= \n2016d x", "=2016C", "=9999999999a", *oddities],
     system + "/Europe/Paris": ["=", None],
-    "/usr/share/icu/icutzformat.txt": ["=44l"] * 20 + ["=44b", *oddities],
+    "/usr/share/icu/icutzformat.txt": ["=44l"] * 20 + ["=44b", "=?", *oddities],
     "~/zoneinfo": ["->@/zoneinfo"] * 20 + ["->" + system] * 9 + ["->@", "->~/tz//zoneinfo",
-                   "->../timezone/tz/2016d/zoneinfo", "->@/../2016e.1.0/zoneinfo", *oddities],
+                   "->../timezone/tz/2016d/zoneinfo", "->@/../2016e.1.0/zoneinfo", "->@?/zoneinfo",
+                   *oddities],
     "~/icutz": ["->@/icutz"] * 9 + [None] * 9 + oddities,
-    "~/tz_latest": ["->@"] * 30 + [None] * 9 + ["->@/", "->~/tz/", "->@/../2016d", *oddities],
+    "~/tz_latest": ["->@"] * 30 + [None] * 9 + ["->@/", "->~/tz/", "->@/../2016d", "->@?", *oddities],
     "~/localtime": ["->~/zoneinfo/Europe/Paris"] * 9 + ["->/usr/share/zoneinfo/Europe/Paris",
-                    "->/usr/share/zoneinfo/x", "->/usr/share/zoneinfo", *oddities],
+                    "->/usr/share/zoneinfo/x", "->/usr/share/zoneinfo?", *oddities],
     "~/needs_cleanup": ["->@/icutz/icutz44l.dat", *oddities],
     "~/TZVersionDiffRecord": ["->@/zoneinfo/Europe/Paris", *oddities],
     "/var/db/icutz": [None] * 9 + ["->@/icutz", "->~/icutz", "->/usr", *oddities],
@@ -44,11 +47,20 @@ update_icu = {
 linked_icu = {"/icutz": ["->@/icutz", "->~/icutz", "->/var/db/icutz", *oddities]}
 
 
+def some_bytes(chance):
+    """A few bytes, many of them in no text; none ends a name or a line."""
+    likely = b"\\x5c\\\xff\xe9\xed\xa0\x80\x1b\xe2\x80\xae\x7f"
+    some = [chance.choice(likely) if chance.random() < 0.7 else chance.randrange(1, 256)
+            for _ in range(chance.randrange(1, 6))]
+    return os.fsdecode(bytes(some).translate(None, b"/\n") or b"\\")
+
+
 def lay(path, choices, chance):
     """Puts one of the choices at a path, unless something there is in the way."""
     def spelt(text):
         some_update = "~/tz/" + chance.choice(updates)
-        return text.replace("@", some_update).replace("~", "/var/db/timezone")
+        text = text.replace("@", some_update).replace("~", "/var/db/timezone")
+        return text.replace("?", some_bytes(chance)) if "?" in text else text
 
     path, what = spelt(path), chance.choice(choices)
     if what is None or os.path.lexists(path):
@@ -62,7 +74,7 @@ def lay(path, choices, chance):
         os.mkfifo(path)
     else:
         with open(path, "wb") as file:
-            file.write(what[1:].encode())
+            file.write(os.fsencode(spelt(what[1:])))
         os.chmod(path, 0o600 if what == "-" else 0o644)
 
 
@@ -75,7 +87,7 @@ def lay_out(chance):
     if chance.random() < 0.1:
         lay(chance.choice(["~", "~/tz"]), ["->/data", "->/var/db/icu", "->/var/db/icutz"], chance)
     try:
-        for update in updates:
+        for update in updates + [chance.choice(updates) + "?"]:
             for name, choices in (update_icu if chance.random() < 0.9 else linked_icu).items():
                 lay("~/tz/" + update + name, choices, chance)
         for path, choices in menu.items():
@@ -100,10 +112,6 @@ def everything():
             for status in [os.lstat(path)]}
 
 
-def run(*command):
-    return subprocess.run(command, capture_output=True, timeout=20, check=False)
-
-
 def what_happened(before, status, said):
     """In the words of tzctl, judged by what a start has left behind and said."""
     zoneinfo, icutz, localtime = links()
@@ -123,40 +131,84 @@ def what_happened(before, status, said):
             "localtime": localtime, "changes": links() != before}
 
 
-def check(number):
+def as_on_disk(told):
+    """What tzctl tells, with every text as the bytes that it stands for."""
+    if isinstance(told, dict):
+        return {key: as_on_disk(value) for key, value in told.items()}
+    if isinstance(told, list):
+        return [as_on_disk(value) for value in told]
+    return told if not isinstance(told, str) else os.fsdecode(
+        re.sub(rb"\\x([0-9a-f]{2})", lambda byte: bytes([int(byte[1], 16)]), told.encode()))
+
+
+def agree(decision, current, latest):
+    """Whether a start that has found this of the two links can have decided so."""
+    if decision == "keep":
+        return current == "fits" and latest not in ("fits", "failed")
+    if decision == "drop":
+        return current in ("other schema", "not newer") and latest not in ("fits", "failed")
+    return decision != "adopt" or latest == "fits"
+
+
+class Programs:
+    """Those of a build directory, which work on this process's root directory from outside."""
+    def __init__(self, build, root):
+        self.outside = os.open("/", os.O_RDONLY)
+        self.tzctl = [os.path.abspath(build) + "/tzctl", "--root", root]
+        self.start = [os.path.abspath(build) + "/tests/tzreconcile", root]
+        if not os.path.exists(self.start[0]):  # the program is static
+            shutil.copy(build + "/tzreconcile", root)
+            self.start = ["chroot", root, "/tzreconcile"]
+
+    def leave_root(self):
+        os.fchdir(self.outside)
+        os.chroot(".")
+
+    def run(self, command):
+        return subprocess.run(command, capture_output=True, timeout=60, check=False,
+                              preexec_fn=self.leave_root)
+
+
+def check(number, programs):
     """Lays out one state, and has it foretold and started; returns the decision."""
     lay_out(random.Random(number))
     before, disk = links(), everything()
-    looked = run("/tzctl", "status", "--json")
-    assert (looked.returncode, looked.stderr) == (0, b""), looked
-    assert everything() == disk, "looking has changed the disk"
-    foretold = json.loads(looked.stdout)["next_start"]
-    assert foretold.pop("reason")
-    told = run("/tzctl").stdout.decode().partition("It will say")[2].partition("\n\n")[0]
-    start = run("/tzreconcile")
-    said = start.stderr.decode().replace("tzreconcile: ", "")
-    happened = what_happened(before, start.returncode, said)
+    looked = programs.run([*programs.tzctl, "status", "--json"])
+    assert (looked.returncode, looked.stderr) == (0, b""), f"{number}: {looked}"
+    assert everything() == disk, f"{number}: looking has changed the disk"
+    told = as_on_disk(json.loads(looked.stdout))
+    foretold = told["next_start"]
+    shown = [told["links"][name]["target"] for name in ("zoneinfo", "icutz", "localtime")]
+    assert shown == before, f"{number}: showed {shown} instead of {before}"
+    reason, warnings = foretold.pop("reason"), foretold.pop("warnings")
+    current, latest = foretold.pop("current"), foretold.pop("latest")
+    start = programs.run(programs.start)
+    said = [line.partition(": ")[2] for line in os.fsdecode(start.stderr).split("\n")[:-1]]
+    happened = what_happened(before, start.returncode, "\n".join(said))
     assert foretold == happened, f"{number}:\nforetold {foretold}\nhappened {happened}\n{said}"
-    for line in said.splitlines():
-        message = " ".join(line.rpartition(": ")[0].split())
-        assert message in " ".join(told.split()), f"{number}:\ntold {told}\nsaid {said}"
+    assert agree(foretold["decision"], current, latest) and reason, (
+        f"{number}: {foretold['decision']}, though current {current}, latest {latest}: {reason}")
+    assert len(said) == len(warnings) and all(
+        (line + ": ").startswith(line_said.rpartition(": ")[0] + ": ")
+        for line, line_said in zip(warnings, said)), f"{number}:\ntold {warnings}\nsaid {said}"
     return happened["decision"]
 
 
 def main(build, states="300", seed="0"):
     if os.geteuid() != 0:
+        print("Not root, so this needs user namespaces, which a chroot does not allow.",
+              file=sys.stderr, flush=True)
         os.execvp("unshare", ["unshare", "--map-root-user", sys.executable, *sys.argv])
+    os.environ["ASAN_OPTIONS"] = "detect_leaks=0"  # which cannot be done in another root
     with tempfile.TemporaryDirectory() as root:
-        for program in ("tzctl", "tzreconcile"):
-            shutil.copy(f"{build}/{program}", root)
-        outside = os.open("/", os.O_RDONLY)
+        programs = Programs(build, root)
         os.chroot(root)
         os.chdir("/")
         try:
-            decisions = [check(number) for number in range(int(seed), int(seed) + int(states))]
+            decisions = [check(number, programs)
+                         for number in range(int(seed), int(seed) + int(states))]
         finally:
-            os.fchdir(outside)
-            os.chroot(".")
+            programs.leave_root()
     missing = {"keep", "adopt", "drop", "reset", "fail"} - set(decisions)
     assert not missing, f"no state led to {missing}"
     print(f"{len(decisions)} states foretold")

@@ -6,136 +6,255 @@ set -eu
 tzctl=$(realpath "$1")/tzctl
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
-cd "$work"
-state=root/var/db/timezone
-fail() { echo "$*" >&2 && exit 1; }
+mkdir "$work/now"
+cd "$work/now"
+export ASAN_OPTIONS=detect_leaks=0 # which cannot be done in another root
+s=root/var/db/timezone
 
 dataset() { # DIRECTORY SCHEMA
     mkdir -p "$1/zoneinfo/Europe" "$1/icutz"
     printf TZif2 >"$1/zoneinfo/Europe/Paris"
+    echo "${1##*/}" >"$1/zoneinfo/+VERSION"
     touch "$1/icutz/icutz$2.dat"
 }
 
-# The system at 2016c, update 2016d current, and others older, newer, incompatible and latest.
-lay_out() {
-    chmod -R u+rwX root 2>/dev/null || true
-    rm -rf root 20* .2016h
-    mkdir -p root/usr/share/{icu,zoneinfo.default} $state/tz
-    echo 2016c >root/usr/share/zoneinfo.default/+VERSION
-    printf TZif2 >root/usr/share/zoneinfo.default/UTC
-    echo 44l >root/usr/share/icu/icutzformat.txt
-    for update in 2016b:44l 2016d:44l 2016e:44b 2016f:44l 2016g:44l; do
-        dataset "$state/tz/${update%:*}" "${update#*:}"
-    done
-    ln -s /var/db/timezone/tz/2016d/zoneinfo $state/zoneinfo
-    ln -s /var/db/timezone/tz/2016d/icutz $state/icutz
-    ln -s /var/db/timezone/tz/2016f $state/tz_latest
-    ln -s /var/db/timezone/zoneinfo/Europe/Paris $state/localtime
-    dataset 2016h 44l
+link() { # TARGET NAME: in the state directory; "@g" is update 2016g
+    ln -sfn "${1/@//var/db/timezone/tz/2016}" "$s/$2"
 }
+
+# The system at 2016c, update 2016d current, and others older, newer, incompatible and latest.
+mkdir -p root/usr/share/{icu,zoneinfo.default} $s/tz
+echo 2016c >root/usr/share/zoneinfo.default/+VERSION
+printf TZif2 >root/usr/share/zoneinfo.default/UTC
+echo 44l >root/usr/share/icu/icutzformat.txt
+for update in $s/tz/2016{b,d,f,g} 2016h; do dataset "$update" 44l; done
+dataset $s/tz/2016e 44b
+link @d/zoneinfo zoneinfo
+link @d/icutz icutz
+link @f tz_latest
+link /var/db/timezone/zoneinfo/Europe/Paris localtime
+mv "$PWD" "$work/given"
 
 ctl() { "$tzctl" --root root "$@"; }
-disturbed() { strace -qqo /dev/null -e inject="$1" "$tzctl" --root root "${@:2}"; } # HOW VERB...
-mounted() { # FILE: what is told while it is a mount point
-    unshare --map-root-user --mount sh -c "mount --bind $PWD/root/usr/share/icu/icutzformat.txt $1 &&
-        '$tzctl' --root root"
+# shellcheck disable=SC2086 # there may be several options
+disturbed() { strace -qqo /dev/null -e inject=$1 "$tzctl" --root root "${@:2}"; } # HOW VERB...
+mounted() { # FILE-OR-DIRECTORY PLACE MODE VERB: while the one lies over the other
+    local as_root=()
+    [ "$(id -u)" -eq 0 ] || as_root=(--map-root-user)
+    # shellcheck disable=SC2016 # expanded by sh
+    unshare "${as_root[@]}" --mount --propagation unchanged sh -c '
+        mount --bind "$1" "$2" && mount -o "remount,bind,$3" "$2" || exit
+        "$0" --root root "$4" && status=0 || status=$?
+        umount $(grep -o " $PWD/root[^ ]*" /proc/mounts)
+        exit $status' "$tzctl" "$@"
 }
-in_order() { if ctl | grep -P '\x1b|.{81}|not as it should'; then return 1; fi; echo fits; }
+come_up() { # NAME: makes that directory while an update is on its way into its place
+    for _ in {1..500}; do
+        compgen -G "$s/tz/.tzctl.*" >/dev/null && break
+        sleep 0.01
+    done
+    sleep 0.3 && mkdir "$s/tz/$1"
+}
+in_order() { if ctl | grep -P '\x1b|.{81}|Problems'; then return 1; fi; echo fits; }
 coloured_lines() { env "$@" script -qec "'$tzctl' --root root" /dev/null | grep -c $'\e'; }
 told() { ctl status --json | jq -cr "$1"; }
-left() { # the versions in the links, and the updates
-    for link in $state/{zoneinfo,icutz,tz_latest}; do readlink "$link" || echo none; done |
-        sed 's:/var/db/timezone/tz/::; s:/usr/share/::' | paste -s -d ' '
-    ls -A $state/tz/ 2>/dev/null || true
+left() { # the versions in the links; the updates; what a tzctl has left behind
+    for link in $s/{zoneinfo,icutz,tz_latest}; do
+        readlink "$link" || { [ -e "$link" ] && echo other || echo none; }
+    done | sed 's:/var/db/timezone/tz/2016\([a-z]\)\(/zoneinfo\|/icutz\)\?$:\1:; s:/usr/share/::'
+    find $s/tz/ -mindepth 1 -maxdepth 1 -printf '%f\n' 2>&1 | sed 's/^2016//; s/^\.tzctl\..*/.tzctl.*/' | sort
+    find root/var/db $s -maxdepth 1 -name '*tzctl*' ! -name .tzctl.lock -printf '%f\n' 2>&1
 }
 
-# Before the commands something may be changed. Unless they succeed, nothing else may be.
-while IFS='|' read -r commands status said after; do
-    lay_out
-    case $commands in *';'*) eval "${commands%;*}" >/dev/null ;; esac
-    before=$(left)
-    (eval "${commands##*;}") </dev/null >output 2>&1 && actual=0 || actual=$?
-    [ "$actual" = "$status" ] || fail "$commands: exit status $actual: $(cat output)"
-    grep -qF -- "$said" output || fail "$commands: $(cat output)"
-    [ "$(left | xargs)" = "${after:-$(echo "$before" | xargs)}" ] || fail "$commands: left $(left)"
-done <<'END'
-ctl install 2016h|0|adopts update 2016h|2016d/zoneinfo 2016d/icutz 2016h 2016b 2016d 2016e 2016f 2016g 2016h
-mkdir root/new; mv 2016h root/new; ctl install /new/2016h/|0|adopts|2016d/zoneinfo 2016d/icutz 2016h 2016b 2016d 2016e 2016f 2016g 2016h
-cp -r 2016h root; rm -r 2016h/zoneinfo; ctl install 2016h|1|holds no tz database
-mkdir -p root$PWD; cp -r 2016h root$PWD; rm -r 2016h/zoneinfo; ctl install $PWD/2016h|0|adopts|2016d/zoneinfo 2016d/icutz 2016h 2016b 2016d 2016e 2016f 2016g 2016h
-mkdir $state/tz/.tzctl; ctl install 2016h|0|adopts|2016d/zoneinfo 2016d/icutz 2016h 2016b 2016d 2016e 2016f 2016g 2016h
-mv 2016h 2016a; ctl install 2016a|1|2016a is not newer than 2016d
-mv 2016h 2016a; ctl install --force 2016a|0|keeps update 2016d|2016d/zoneinfo 2016d/icutz 2016a 2016a 2016b 2016d 2016e 2016f 2016g
-mv 2016h/icutz/icutz44{l,b}.dat; ctl install 2016h|1|2016h has ICU schema 44b, the system ICU schema 44l.
-rm -r 2016h/zoneinfo; ctl install 2016h|1|holds no tz database
-mv 2016h 2016H; ctl install 2016H|1|"2016H" is not a version
-mv 2016h .2016h; ctl install --force .2016h|1|".2016h" is not a version
-mv 2016h 20160000000h; ctl install 20160000000h|1|a number beyond 2147483647
-mv 2016h 2016g; ctl install 2016g|1|2016g is installed already
-mkfifo 2016h/zoneinfo/pipe; ctl install 2016h|1|pipe is neither a file
-mv $state/tz root/; ln -s /tz $state/tz; ctl install 2016h|1|a link perhaps
-rm -r $state; ctl install 2016h|1|timezone/: No such file
-rm -r 2016h/zoneinfo; ctl install --force 2016h|0|holds no tz database|2016d/zoneinfo 2016d/icutz 2016h 2016b 2016d 2016e 2016f 2016g 2016h
-ctl install missing|1|missing: No such file
-rm $state/tz_latest; mkdir $state/tz_latest; ctl install 2016h|1|tz_latest
-ctl use 2016f|0|Current now: update 2016f.|2016f/zoneinfo 2016f/icutz 2016f 2016b 2016d 2016e 2016f 2016g
-ctl use 2016f && told .next_start.decision|0|keep|2016f/zoneinfo 2016f/icutz 2016f 2016b 2016d 2016e 2016f 2016g
-ctl use system && told .next_start.decision|0|keep|zoneinfo.default none none 2016b 2016d 2016e 2016f 2016g
-ln -s x $state/zoneinfo.tzctl-new; ln -s x $state/icutz.tzctl-old; ln -s x $state/tz_latest.tzctl-new; ctl use 2016f|0|Current now|2016f/zoneinfo 2016f/icutz 2016f 2016b 2016d 2016e 2016f 2016g
-ctl use 2016b|1|2016c.1.0 (the system's own data) is newer than 2016b.
-ctl use 2016e|1|2016e has ICU schema 44b
-ctl use 2016h|1|"2016h" is not installed
-ctl use ..|1|is not installed
-ctl use ../tz/2016f|1|is not installed
-rm -r $state/tz/2016f/zoneinfo; ctl use 2016f|1|holds no tz database
-rm $state/icutz; mkdir $state/icutz; ctl use 2016f|1|File exists
-ctl cleanup --dry-run|0|Would delete update 2016b
-head -c 3000000 /dev/zero >$state/tz/2016b/x; ln $state/tz/2016b/{x,y}; ctl cleanup --dry-run|0|update 2016b: 3.0 MB
-ln -sfn localtime $state/localtime; ctl cleanup --dry-run|0|Would delete update 2016b
-ctl cleanup|0|Deleted update 2016g|2016d/zoneinfo 2016d/icutz 2016f 2016d 2016f
-ln -sfn /var/db/timezone/tz/2016g/../2016d/icutz $state/icutz; ctl cleanup|0|2016b|2016d/zoneinfo 2016g/../2016d/icutz 2016f 2016d 2016f 2016g
-mv $state/tz/2016b root/; ln -s ../../../../2016b $state/tz/2016b; ctl cleanup && cat root/2016b/zoneinfo/Europe/Paris|0|TZif|2016d/zoneinfo 2016d/icutz 2016f 2016b 2016d 2016f
-ln -sfn 2016g $state/tz/2016d; rm -r $state/tz/2016d/2016g; ln -sfn tz/2016d/../2016b $state/tz_latest; ctl cleanup|0|2016e|2016d/zoneinfo 2016d/icutz tz/2016d/../2016b 2016b 2016d
-ln -sfn $(printf %0300d 0) $state/localtime; ctl cleanup|1|File name too long
-ln -sfn nowhere $state/zoneinfo; ctl cleanup|1|current link cannot be read
-rm $state/tz_latest; touch $state/tz_latest; ctl cleanup|1|tz_latest cannot be read
-mv $state/tz root/; ln -s /tz $state/tz; ctl cleanup|1|a link perhaps
-disturbed sendfile:signal=INT:when=1 install 2016h|1|interrupted
-disturbed rename:error=EIO:when=2 install 2016h|1|tz_latest: Input/output error
-disturbed rename:error=EIO:when=2 use 2016f|1|tz_latest: Input/output error
-disturbed rename:signal=INT:when=1 cleanup|1|interrupted|2016d/zoneinfo 2016d/icutz 2016f 2016d 2016e 2016f 2016g
-exec {lock}<$state; flock $lock; ctl install 2016h|1|another tzctl is at work
-ctl status >/dev/full|1|standard output
-ctl --version >&-|1|standard output
-in_order|0|fits
-coloured_lines NO_COLOR=|0|3
-coloured_lines NO_COLOR=1|1|0
-ctl|0|yes         yes   latest
-ctl|0|yes         no    may be removed
-ln -sfn nowhere $state/zoneinfo; ctl|0|It will say
-rm -r $state/tz/*; echo 9999999999a >root/usr/share/zoneinfo.default/+VERSION; ctl|0|  icutz     -> /var
-rm $state/localtime; touch $state/localtime; mounted $state/localtime|0|create_symlink: from /var/db/timezone/localtime
-rm $state/icutz; ctl|0|What is not as it should be
-touch $state/tz/note; mkdir $state/tz/.tzctl; told '.installed[5] == null'|0|true
-mv $state/tz/{2016g,9999999999a}; told '[.installed[4]["version", "newer_than_system"], .findings[0]]'|0|["9999999999a",false,"9999999999a: the version holds a number beyond 2147483647"]
-echo 9999999999a >root/usr/share/zoneinfo.default/+VERSION; told '[.system, .current.newer_than_system, .findings[0]]'|0|[null,false,"No start can use the system's own data"
-rm root/usr/share/zoneinfo.default/UTC; told .findings[]|0|There is no zone file in /usr/share/zoneinfo.default.
-rm $state/icutz $state/tz_latest; mkdir $state/icutz; ln -sfn nowhere $state/localtime; told '[.links[].state]'|0|["ok","not a link","missing","dangling"]
-touch $state/needs_cleanup; printf 2016c_2016d >$state/TZVersionDiffRecord; told '[.format, .marker, .record]'|0|[1,true,"2016c_2016d"]
-ln -sfn nowhere $state/zoneinfo; told .findings[]|0|Bad zoneinfo link
-ln -sfn nowhere $state/tz_latest; told .findings[]|0|The latest link leads nowhere.
-ctl use system; ln -s x $state/icutz; told .findings[]|0|The ICU link has been left behind
-told '.installed[0].version + .installed[4].version + .system.version'|0|2016g2016b2016c.1.0
-ln -sfn "$(printf 'a\377b\033')" $state/localtime; told .links.localtime.target|0|a\xffb
-ln -sfn "$(printf 'a\377b\033\302\233\177\303\251')" $state/localtime; ctl|0|a\xffb\x1b\xc2\x9b\x7fé
-rm $state/icutz; told .findings[]|0|The ICU link does not lead into the current update
-ln -sfn /var/db/timezone/zoneinfo/Europe $state/localtime; told .findings[]|0|The local-time link leads to no zone file
-rm $state/tz/2016f/zoneinfo/Europe/Paris; told .findings[]|0|lacks the local zone
-ctl --help|0|Delete the updates
-ctl use|2|tzctl: VERSION
-"$tzctl" --root "" cleanup|2|--root
-ctl frobnicate|2|frobnicate
-ctl status cleanup|2|cleanup
-ctl make update|2|takes no --root
-"$tzctl" make frobnicate|2|usage: make-dataset
+"$tzctl" --root "$work/given/root" >/dev/null # or it says what is missing, such as user namespaces
+failures=0
+# A line that is indented goes on with the row before. Without anything in the last column, nothing
+# may be left that was not there before the command.
+while IFS='|' read -r about setup command status said after; do
+    rm -rf "$work/now" && cp -a "$work/given" "$work/now" && cd "$work/now"
+    eval "$setup" >/dev/null
+    [ -n "$after" ] || after=$(left | xargs)
+    (eval "$command") </dev/null >output 2>&1 && actual=0 || actual=$?
+    [ "$actual" = "$status" ] && grep -qF -- "$said" output && [ "$(left | xargs)" = "$after" ] && continue
+    echo "$about: exit status $actual, left $(left | xargs): $(cat output)" >&2
+    failures=$((failures + 1))
+done < <(sed -z 's/\n  *//g' <<'END'
+install||ctl install 2016h|0|adopts update 2016h|d d h b d e f g h
+- with a slash at the end|mkdir new; mv 2016h new|ctl install new/2016h/|0|adopts|d d h b d e f g h
+- by an absolute path, where the caller is|mkdir root/new; mv 2016h root/new|ctl install /new/2016h|1|
+    /new/2016h: No such file
+- by a path that is in the image, too|mkdir -p root$PWD; cp -r 2016h root$PWD; rm -r 2016h/zoneinfo|
+    ctl install $PWD/2016h|1|holds no zone
+- by a link that leads to itself|ln -s loop loop|ctl install loop/2016h|1|loop/2016h: Too many levels
+- nothing||ctl install missing|1|tzctl: missing: No such file
+- a file||ctl install root/usr/share/icu/icutzformat.txt|1|Not a directory
+- what is older|mv 2016h 2016a|ctl install 2016a|1|2016a is not newer than 2016d
+- what is older, by force|mv 2016h 2016a|ctl install --force 2016a|0|keeps update 2016d|d d a a b d e f g
+- another schema|mv 2016h/icutz/icutz44{l,b}.dat|ctl install 2016h|1|2016h has ICU schema 44b, the system
+- no zones|rm -r 2016h/zoneinfo|ctl install 2016h|1|holds no zone
+- no zones, by force|rm -r 2016h/zoneinfo|ctl install --force 2016h|0|holds no zone|d d h b d e f g h
+- zones in posix and right only|mv 2016h/zoneinfo new; mkdir 2016h/zoneinfo; cp -r new 2016h/zoneinfo/right;
+    mv new 2016h/zoneinfo/posix|ctl install 2016h|1|holds no zone
+- no version as a name|mv 2016h 2016H|ctl install 2016H|1|2016H: not a version
+- a hidden name, by force|mv 2016h .2016h|ctl install --force .2016h|1|.2016h: not a version
+- too large a number|mv 2016h 20160000000h|ctl install 20160000000h|1|a number beyond 2147483647
+- again|ctl install 2016h; link @f tz_latest|ctl install 2016h|0|installed already|d d h b d e f g h
+- other data again|ctl install 2016h; printf x >>2016h/zoneinfo/Europe/Paris|ctl install --force 2016h|1|
+    tz/2016h: installed already, with other
+- fewer data again|ctl install 2016h; rm 2016h/icutz/*|ctl install --force 2016h|1|installed already
+- an old release under a new name|echo 2016g >2016h/zoneinfo/+VERSION|ctl install 2016h|1|is of release 2016g
+- older ICU data|echo 2016h >$s/tz/2016d/icutz/+VERSION; echo 2016g >2016h/icutz/+VERSION|ctl install 2016h|1|
+    older than the current 2016h
+- a FIFO|mkfifo 2016h/zoneinfo/pipe|ctl install 2016h|1|2016h/zoneinfo/pipe: neither a file, a directory nor
+- too deep a directory|mkdir -p 2016h/zoneinfo/1/2/3/4/5/6/7/8/9/10/11/12/13/14/15/16/17|ctl install 2016h|1|too
+- zones by a link out|mv 2016h/zoneinfo new; ln -s ../new 2016h/zoneinfo|ctl install --force 2016h|1|
+    2016h/zoneinfo: a symbolic link that leads out
+- a link out and in again|ln -s ../../2016h/icutz 2016h/zoneinfo/x|ctl install 2016h|1|2016h/zoneinfo/x: a symb
+- an absolute link|ln -s $PWD/2016h/zoneinfo/Europe 2016h/zoneinfo/x|ctl install 2016h|1|2016h/zoneinfo/x: a symb
+- a link to nowhere|ln -s nowhere 2016h/zoneinfo/x|ctl install 2016h|1|2016h/zoneinfo/x: a symb
+- links inside|ln -s Europe 2016h/zoneinfo/x; ln -s x/../../icutz/./icutz44l.dat 2016h/zoneinfo/y|
+    ctl install 2016h && cat $s/tz/2016h/zoneinfo/x/Paris|0|TZif2|d d h b d e f g h
+- modes|chmod 700 2016h/icutz; chmod 4600 2016h/zoneinfo/Europe/Paris|ctl install 2016h;
+    echo $(stat -c %a $s/tz/2016h/{icutz,zoneinfo/Europe/Paris})|0|755 644|d d h b d e f g h
+- beside what is half-made|mkdir -p $s/tz/.tzctl.0/x $s/tz/.tzctl; touch $s/.tzctl.x|ctl install 2016h|0|adopts|
+    d d h b d e f g h
+- a link in the place of the updates|mv $s/tz root/; ln -s /tz $s/tz|ctl install 2016h|1|
+    root/var/db/timezone/tz: not a directory (a symbolic link
+- no updates|rm -r $s/tz|ctl install 2016h|1|root/var/db/timezone/tz: No such file
+- no state directory|rm -r $s|ctl install 2016h|1|tzctl: root/var/db/timezone/: No such file
+- an interruption||disturbed write,sendfile,copy_file_range:signal=INT:when=1 install 2016h|130|
+- a link that cannot be replaced||disturbed ?rename,?renameat,renameat2:error=EIO:when=2 install 2016h|1|
+    root/var/db/timezone/tz_latest: Input/output error
+- a name that comes up meanwhile||come_up 2016h &
+    disturbed ?rename,?renameat,renameat2:delay_enter=600000:when=1 install 2016h|1|File exists|d d f b d e f g h
+- where renaming has no flags||disturbed renameat2:error=EINVAL install 2016h|0|adopts|d d h b d e f g h
+- what cannot be brought onto the disk||disturbed ?sync,syncfs:error=EIO install 2016h|1|Input/output error
+- beside another||exec {lock}<>$s/.tzctl.lock; flock $lock; ctl install 2016h|1|another tzctl is running
+- beside whoever may read the directory||exec {lock}<$s; flock -s $lock; ctl install 2016h|0|adopts|
+    d d h b d e f g h
+- a lock that leads elsewhere|ln -s /x $s/.tzctl.lock|ctl install 2016h|1|.tzctl.lock
+use||ctl use 2016f|0|Current now: update 2016f.|f f f b d e f g
+- it is kept|ctl use 2016f|told .next_start.decision|0|keep
+- the system's own data|ctl use system|told .next_start.decision|0|keep|zoneinfo.default none none b d e f g
+- what is older||ctl use 2016b|1|2016c.1.0 (the system's own data) is newer than 2016b.
+- another schema||ctl use 2016e|1|2016e has ICU schema 44b
+- nothing||ctl use 2016h|1|tzctl: 2016h: not installed
+- what is elsewhere||ctl use ../tz/2016f|1|not installed
+- a link|ln -s 2016g $s/tz/2016i|ctl use 2016i|1|not installed
+- no zones|rm -r $s/tz/2016f/zoneinfo|ctl use 2016f|1|holds no zone
+- beside a legacy link to nowhere|ln -s /nowhere root/var/db/icutz; ctl use 2016g|
+    ctl use 2016f; ls root/var/db|0|timezone|f f f b d e f g
+- a directory in a link's place|rm $s/icutz; mkdir -p $s/icutz/x|ctl use 2016f|1|root/var/db/timezone/icutz: 
+- a file in a link's place|rm $s/tz_latest; touch $s/tz_latest|
+    disturbed ?rename,?renameat,renameat2:error=EIO:when=2 use 2016f|1|Input/output error
+- a link that cannot be replaced||disturbed ?rename,?renameat,renameat2:error=EIO:when=2 use 2016f|1|root/var/db/
+- where renaming has no flags||disturbed renameat2:error=EINVAL use 2016f|0|2016f|f f f b d e f g
+- and a link cannot be replaced|rm $s/tz_latest; touch $s/tz_latest|
+    disturbed "renameat2:error=EINVAL -e inject=?rename,renameat:error=EIO:when=3" use 2016f|1|output error
+- what cannot be brought onto the disk||disturbed ?sync,syncfs,fsync:error=EIO use 2016f|1|Input/output error
+- unfinished|ln -s 2016f $s/.tzctl.use.0|told .findings[]|0|tzctl use 2016f
+- unfinished, then cleanup|ln -s 2016f $s/.tzctl.use.0; link @f/zoneinfo zoneinfo|ctl cleanup|0|2016d|f f f f
+- unfinished, but unfit by now|ln -s 2016e $s/.tzctl.use.0|ctl cleanup|0|2016e has ICU schema|d d f d f
+cleanup||ctl cleanup|0|Deleted update 2016g|d d f d f
+- nothing|ctl cleanup|ctl cleanup|0|no update
+- as a rehearsal||ctl cleanup --dry-run|0|Would delete update 2016b
+- how much it frees|head -c 3000000 /dev/zero >$s/tz/2016b/x; ln $s/tz/2016b/{x,y}|ctl cleanup --dry-run|0|b: 3.0 MB
+- what is no update|mkdir $s/tz/{lost+found,.snapshot,2016z.partial,.make-dataset.x}|ctl cleanup|0|2016g|
+    d d f .make-dataset.x .snapshot d f lost+found z.partial
+- a local time that leads to itself|link localtime localtime|ctl cleanup --dry-run|0|Would delete update 2016b
+- what is passed on the way|link @g/../2016d/icutz icutz|ctl cleanup|0|2016b|
+    d /var/db/timezone/tz/2016g/../2016d/icutz f d f g
+- a link to an update|mv $s/tz/2016b root/; ln -s ../../../../2016b $s/tz/2016b|
+    ctl cleanup; cat root/2016b/zoneinfo/Europe/Paris|0|TZif|d d f b d f
+- what a linked update passes|rm -r $s/tz/2016d; ln -s 2016g $s/tz/2016d; link tz/2016d/../2016b tz_latest|
+    ctl cleanup|0|2016e|d d tz/2016d/../2016b b d g
+- a local time by too long a name|link $(printf %0300d 0) localtime|ctl cleanup --dry-run|0|Would delete update 2016b
+- a current link to nowhere|link nowhere zoneinfo|ctl cleanup|1|root/var/db/timezone/zoneinfo: names nothing
+- no latest link that can be read|rm $s/tz_latest; touch $s/tz_latest|ctl cleanup|1|root/var/db/timezone/tz_latest:
+- a link in the place of the updates|mv $s/tz root/; ln -s /tz $s/tz|ctl cleanup|1|timezone/tz: not a directory
+- an interruption||disturbed ?rename,?renameat,renameat2:signal=TERM:when=1 cleanup|143||d d f d e f g
+- what has a mount point in it, and others|mkdir $s/tz/2016b/x|mounted root/usr/share $s/tz/2016b/x rw cleanup|1|
+    tzctl: root/var/db/timezone/tz/|d d f .tzctl.* d f
+- a mount point|cp -r root/usr/share/icu root/x; mkdir $s/tz/2016b/x|
+    mounted root/x $s/tz/2016b/x rw cleanup; ls root/x|0|icutzformat.txt|d d f .tzctl.* d f
+- what cannot be read||disturbed openat,openat2:error=EIO:when=4+ cleanup|1|Input/output error
+status, in order||in_order|0|fits
+- coloured||coloured_lines NO_COLOR=|0|4
+- not coloured||coloured_lines NO_COLOR=1|1|0
+- of the latest update||ctl|0|yes        yes   latest
+- of what is not in use||ctl|0|yes        no    may be removed
+- printed to nowhere||ctl status >/dev/full|1|standard output
+- what a start writes|link nowhere zoneinfo|told .next_start.warnings[0]|0|Bad zoneinfo link nowhere
+- a verdict|link @e tz_latest|told '[.next_start["current", "latest"]]'|0|["fits","other schema"]
+- a reason that only now holds|rm -r $s/tz/2016g/icutz; ln -s ../../icutz $s/tz/2016g/icutz; link @g tz_latest|
+    ctl|0|2016g is compatible and newer than 2016d.
+- no updates|rm -r $s/tz/*; echo 9999999999a >root/usr/share/zoneinfo.default/+VERSION|ctl|0|  icutz     -> /var
+- what a start cannot replace|rm $s/localtime; touch $s/localtime|
+    mounted root/usr/share/icu/icutzformat.txt $s/localtime rw status|0|create_symlink: from /var/db/timezone/localtime
+- a state directory that cannot be written to||mounted $s $s ro status|0|zoneinfo: Read-only file system
+- a finding|rm $s/icutz|ctl|0|Problems
+- what is no update|touch $s/tz/note; mkdir $s/tz/.tzctl $s/tz/x; ln -s 2016g $s/tz/2016i|told '.installed[5]'|0|null
+- too large a number|mv $s/tz/{2016g,9999999999a}|
+    told '[.installed[4]["version", "newer_than_system"], .findings[0]]'|0|
+    ["9999999999a",false,"9999999999a is a version with a number beyond 2147483647."]
+- too large a number of the system's|echo 9999999999a >root/usr/share/zoneinfo.default/+VERSION|
+    told '[.system, .current.newer_than_system, .findings[0]]'|0|[null,false,"No start can use the system's own data
+- no zones of the system's|rm root/usr/share/zoneinfo.default/UTC|told .findings[]|0|
+    There is no zone file in /usr/share/zoneinfo.default.
+- links|rm $s/icutz $s/tz_latest; mkdir $s/icutz; link nowhere localtime|told '[.links[].state]'|0|
+    ["ok","not a link","missing","dangling"]
+- marker and record|touch $s/needs_cleanup; printf 2016c_2016d >$s/TZVersionDiffRecord|
+    told '[.format, .marker, .record]'|0|[1,true,"2016c_2016d"]
+- a record elsewhere|ln -s /usr/share/icu/icutzformat.txt $s/TZVersionDiffRecord|told .record|0|null
+- a record that is a FIFO|mkfifo $s/TZVersionDiffRecord|told .record|0|null
+- a release elsewhere|ln -sf /usr/share/icu/icutzformat.txt $s/tz/2016g/zoneinfo/+VERSION|
+    told .installed[0].release|0|null
+- a release without end|head -c 9999 /dev/zero >$s/tz/2016g/zoneinfo/+VERSION|told '.installed[0].release[4200:]'|0|
+- no current link that makes sense|link nowhere zoneinfo|told .findings[]|0|Bad zoneinfo link
+- a latest link to nowhere|link nowhere tz_latest|told .findings[]|0|The latest link leads nowhere.
+- an ICU link left behind|ctl use system; ln -s x $s/icutz|told .findings[]|0|The ICU link is left
+- the order of versions||told '.installed[0].version + .installed[4].version + .system.version'|0|2016g2016b2016c.1.0
+- bytes in a name|link "$(printf 'a\377b\033')" localtime|told .links.localtime.target|0|a\xffb
+- a backslash in a name|link 'a\xff' localtime|told .links.localtime.target|0|a\x5cxff
+- controls on a terminal|link "$(printf 'a\377b\033\302\233\177\342\200\256\303\251')" localtime|ctl|0|
+    a\xffb\x1b\xc2\x9b\x7f\xe2\x80\xaeé
+- controls in an argument||ctl "$(printf '\033\342\200\256')"|2|\x1b\xe2\x80\xae
+- no ICU link|rm $s/icutz|told .findings[]|0|The ICU link does not lead into the current update
+- no zone|link /var/db/timezone/zoneinfo/Europe localtime|told .findings[]|0|The local-time link leads to no compiled
+- a zone that is going|rm $s/tz/2016f/zoneinfo/Europe/Paris|told .findings[]|0|lacks the local zone
+- what cannot be read||disturbed openat,openat2:error=EMFILE:when=4+ status|1|: Too many open files
+- no local-time link|rm $s/localtime|told .findings[]|0|the next start makes it lead to /var/db/timezone/zoneinfo/Am
+- what only root can read|chmod 700 $s/tz/2016d|told .findings[2]|0|Only root can read what /var/db/timezone/loc
+- no compiled zone|echo x >$s/tz/2016d/zoneinfo/Europe/Paris|told .findings[]|0|leads to no compiled zone file: local
+- local time that others read|mkdir root/etc; ln -s /usr/share/zoneinfo.default/UTC root/etc/localtime; rm $s/zoneinfo|
+    told .findings|0|leads to no compiled zone file."
+- what programs read|mkdir root/etc; ln -s /var/db/timezone/localtime root/etc|
+    told '[.readers[].follows]'|0|[false,true]
+- no state directory|rm -r $s|told .findings[0]|0|systemd-tmpfiles creates it
+- older than the system's own data|link @b/zoneinfo zoneinfo|
+    told .findings[]|0|"tzctl use system" makes that current
+- a line that every start writes|link @d tz_latest|ctl|0|This is usual
+- as JSON||ctl --json|0|"format": 1
+check||ctl check|0|TZDATA OK - update 2016d is current, the next start adopts update 2016f
+- a finding|rm $s/icutz $s/localtime|ctl check|1|TZDATA WARNING - The ICU link does not lead into
+- old data|link @b/zoneinfo zoneinfo; link @b/icutz icutz|ctl check|1|TZDATA WARNING - The current update is older
+- a start that fails|rm $s/localtime; mkdir -p $s/localtime/x|ctl check|2|TZDATA CRITICAL - 
+- no zones|rm -r $s/tz/2016d/zoneinfo|ctl check|2|TZDATA CRITICAL - The current link leads to no zone file
+- what cannot be read||disturbed openat,openat2:error=EMFILE:when=4+ check|3|TZDATA UNKNOWN - 
+- no image||"$tzctl" --root nowhere check|3|TZDATA UNKNOWN - nowhere: No such file
+- wrong usage||ctl check --verbose|3|TZDATA UNKNOWN - 
+--help||ctl --help|0|Delete updates
+--version, printed to nowhere||ctl --version >&-|1|standard output
+no operand||ctl use|2|tzctl: VERSION
+no image||"$tzctl" --root "" cleanup|2|--root
+- one that is not there||"$tzctl" --root nowhere cleanup|1|tzctl: nowhere: No such file
+no verb||ctl frobnicate|2|frobnicate
+an option of another verb||ctl install --json 2016h|2|--json
+two verbs||ctl status cleanup|2|cleanup
+make||"$tzctl" make frobnicate|2|usage: tzctl make update
+- with an image||ctl make update|2|--root
+- where its script is not|mkdir -p a/b tools; cp "$tzctl" a/b; echo echo run >tools/make-dataset; chmod +x tools/*|
+    a/b/tzctl make update a b c|1|make-dataset: No such file
 END
+)
+[ $failures -eq 0 ] || { echo "$failures failures" >&2 && exit 1; }

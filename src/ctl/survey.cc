@@ -151,7 +151,7 @@ void add_problems_of_data(const survey& found, std::vector<std::string>& all) {
         std::string("There is no zone file in ") + layout::system_zoneinfo + ".");
     add(!found.current_has_zones,
         "The current link leads to no zone file: programs that follow it show UTC for every zone.");
-    add(next.decided == decision::drop && next.current == verdict::not_newer,
+    add(next.current == verdict::not_newer,
         "The current update is older than the system's own data: \"tzctl use system\" makes that "
         "current at once.");
 }
@@ -174,11 +174,11 @@ void add_problems_of_links(const survey& found, std::vector<std::string>& all) {
         add(link.state == link_state::ok && !follow(link.path).is_open_to_others(),
             "Only root can read what " + link.path + " leads to.");
     }
-    const bool is_read = found.etc_localtime.follows;
+    const bool has_local_time = follow(found.etc_localtime.path).leads_to_zone();
     add(found.localtime.state != link_state::missing &&
             !follow(layout::localtime_link).leads_to_zone(),
         std::string("The local-time link leads to no compiled zone file") +
-            (is_read ? ": local time is UTC." : "."));
+            (has_local_time ? "." : ": local time is UTC."));
     add(next.localtime && next.localtime != found.localtime.target,
         "The local-time link is " +
             std::string(found.localtime.state == link_state::missing ? "missing" : "invalid") +
