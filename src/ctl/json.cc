@@ -88,9 +88,9 @@ ordered_json described(const link& link) {
 }
 
 ordered_json described(const reader& reader) {
-    return {{"path", reader.path},
-            {"target", text_or_null(reader.target)},
-            {"follows", reader.follows}};
+    auto object = described(reader.place);
+    object["follows"] = reader.follows;
+    return object;
 }
 
 ordered_json described(const prediction& next, const candidates& linked) {
@@ -140,6 +140,7 @@ void print_as_json(const survey& found) {
                               {"readers",
                                {{"zoneinfo", described(found.zoneinfo_reader)},
                                 {"localtime", described(found.etc_localtime)}}},
+                              {"local_zone", text_or_null(found.local_zone)},
                               {"marker", found.marker},
                               {"record", text_or_null(found.record)},
                               {"next_start", described(found.next_start, found.linked)},

@@ -55,8 +55,8 @@ void print_dataset(const dataset& data, const candidates& linked) {
               << role_of(data, linked) << '\n';
 }
 
-void print_link(const std::string& name, const link& link) {
-    std::cout << "  " << cell(name, 9);
+void print_link(const std::string& name, std::size_t width, const link& link) {
+    std::cout << "  " << cell(name, width);
     if (link.target) {
         std::cout << "-> " << printable(*link.target)
                   << (link.state == link_state::ok ? "" : coloured(" (dangling)", yellow)) << '\n';
@@ -66,13 +66,8 @@ void print_link(const std::string& name, const link& link) {
 }
 
 void print_reader(const reader& reader) {
-    std::cout << "  " << cell(reader.path, 19);
-    if (reader.target) {
-        std::cout << "-> " << printable(*reader.target);
-    } else {
-        std::cout << "is not a link";
-    }
-    std::cout << '\n' << (reader.follows ? "" : "    (not through the current link)\n");
+    print_link(reader.place.path, 19, reader.place);
+    std::cout << (reader.follows ? "" : "    (not through the current link)\n");
 }
 
 // A start that has nothing to do compares the latest update with itself, and prints that.
@@ -159,14 +154,15 @@ void print_for_people(const survey& found) {
     }
     std::cout << '\n';
     print_title(std::string("Links in ") + layout::state_directory);
-    print_link("zoneinfo", found.zoneinfo);
-    print_link("icutz", found.icutz);
-    print_link("tz_latest", found.tz_latest);
-    print_link("localtime", found.localtime);
+    print_link("zoneinfo", 9, found.zoneinfo);
+    print_link("icutz", 9, found.icutz);
+    print_link("tz_latest", 9, found.tz_latest);
+    print_link("localtime", 9, found.localtime);
     std::cout << '\n';
     print_title("What programs read");
     print_reader(found.zoneinfo_reader);
     print_reader(found.etc_localtime);
+    std::cout << "  local zone: " << printable(found.local_zone.value_or("unknown")) << '\n';
     std::cout << "\nLast adoption: " << printable(found.record.value_or("none")) << '\n'
               << "Clean-up pending: " << (found.marker ? "yes" : "no") << '\n';
     if (!found.findings.empty()) {

@@ -11,6 +11,7 @@
 #include <unistd.h>
 
 #include "ctl/failure.h"
+#include "ctl/readers.h"
 #include "ctl/root.h"
 #include "ctl/tree.h"
 #include "ctl/updates.h"
@@ -124,8 +125,7 @@ reader describe_reader(const char* path) {
     struct stat current {};
     const bool has_current = ::lstat(layout::zoneinfo_link, &current) == 0;
     const way there = follow(path);
-    return {path, updates::target_of(path),
-            has_current && there.passes({current.st_dev, current.st_ino})};
+    return {describe_link(path), has_current && there.passes({current.st_dev, current.st_ino})};
 }
 
 bool holds_zones(const std::string& zoneinfo) {
@@ -174,7 +174,7 @@ void add_problems_of_links(const survey& found, std::vector<std::string>& all) {
         add(link.state == link_state::ok && !follow(link.path).is_open_to_others(),
             "Only root can read what " + link.path + " leads to.");
     }
-    const bool has_local_time = follow(found.etc_localtime.path).leads_to_zone();
+    const bool has_local_time = follow(found.etc_localtime.place.path).leads_to_zone();
     add(found.localtime.state != link_state::missing &&
             !follow(layout::localtime_link).leads_to_zone(),
         std::string("The local-time link leads to no compiled zone file") +
@@ -239,6 +239,7 @@ survey look() {
     }
     found.zoneinfo_reader = describe_reader(layout::legacy_zoneinfo);
     found.etc_localtime = describe_reader("/etc/localtime");
+    found.local_zone = local_zone();
     found.current_has_zones = holds_zones(layout::zoneinfo_link);
     add_problems_of_data(found, found.findings);
     add_problems_of_links(found, found.findings);

@@ -47,9 +47,8 @@ struct link {
 
 /// Where programs look for zones, or for local time.
 struct reader {
-    std::string path;
-    std::optional<std::string> target; // if it is a link
-    bool follows = false;              // whether the current link is on its way
+    link place;
+    bool follows = false; // whether the current link is on its way
 };
 
 struct survey {
@@ -61,6 +60,7 @@ struct survey {
     link localtime;
     reader zoneinfo_reader;
     reader etc_localtime;
+    std::optional<std::string> local_zone;
     bool current_has_zones = false;
     bool marker = false; // an update may be removed
     std::optional<std::string> record;
