@@ -4,8 +4,7 @@
 
 usage: prediction_test.py BUILD-DIRECTORY [STATES [SEED]]
 
-The states are laid out in a root directory of its own, which this process enters and its programs
-leave again: tzctl looks at it from outside.
+The states are laid out in a root directory of its own, which this process enters.
 """
 import json
 import os
@@ -150,30 +149,26 @@ def agree(decision, current, latest):
     return decision != "adopt" or latest == "fits"
 
 
-class Programs:
-    """Those of a build directory, which work on this process's root directory from outside."""
-    def __init__(self, build, root):
-        self.outside = os.open("/", os.O_RDONLY)
-        self.tzctl = [os.path.abspath(build) + "/tzctl", "--root", root]
-        self.start = [os.path.abspath(build) + "/tests/tzreconcile", root]
-        if not os.path.exists(self.start[0]):  # the program is static
-            shutil.copy(build + "/tzreconcile", root)
-            self.start = ["chroot", root, "/tzreconcile"]
-
-    def leave_root(self):
-        os.fchdir(self.outside)
-        os.chroot(".")
-
-    def run(self, command):
+def run_in_turn(build, root, leave_root):
+    """Two functions: one runs tzctl's status, from outside of the root directory, the other a start,
+    which a static program does inside, where nothing else is."""
+    def run(leave, *command):
         return subprocess.run(command, capture_output=True, timeout=60, check=False,
-                              preexec_fn=self.leave_root)
+                              preexec_fn=leave and leave_root)
+
+    tzctl, start = os.path.abspath(build + "/tzctl"), os.path.abspath(build + "/tests/tzreconcile")
+    static = not os.path.exists(start)
+    if static:
+        shutil.copy(build + "/tzreconcile", root)
+    return (lambda: run(True, tzctl, "--root", root, "status", "--json"),
+            lambda: run(False, "/tzreconcile") if static else run(True, start, root))
 
 
-def check(number, programs):
+def check(number, foretell, start_up):
     """Lays out one state, and has it foretold and started; returns the decision."""
     lay_out(random.Random(number))
     before, disk = links(), everything()
-    looked = programs.run([*programs.tzctl, "status", "--json"])
+    looked = foretell()
     assert (looked.returncode, looked.stderr) == (0, b""), f"{number}: {looked}"
     assert everything() == disk, f"{number}: looking has changed the disk"
     told = as_on_disk(json.loads(looked.stdout))
@@ -182,7 +177,7 @@ def check(number, programs):
     assert shown == before, f"{number}: showed {shown} instead of {before}"
     reason, warnings = foretold.pop("reason"), foretold.pop("warnings")
     current, latest = foretold.pop("current"), foretold.pop("latest")
-    start = programs.run(programs.start)
+    start = start_up()
     said = [line.partition(": ")[2] for line in os.fsdecode(start.stderr).split("\n")[:-1]]
     happened = what_happened(before, start.returncode, "\n".join(said))
     assert foretold == happened, f"{number}:\nforetold {foretold}\nhappened {happened}\n{said}"
@@ -200,15 +195,21 @@ def main(build, states="300", seed="0"):
               file=sys.stderr, flush=True)
         os.execvp("unshare", ["unshare", "--map-root-user", sys.executable, *sys.argv])
     os.environ["ASAN_OPTIONS"] = "detect_leaks=0"  # which cannot be done in another root
+    outside = os.open("/", os.O_RDONLY)
+
+    def leave_root():
+        os.fchdir(outside)
+        os.chroot(".")
+
     with tempfile.TemporaryDirectory() as root:
-        programs = Programs(build, root)
+        programs = run_in_turn(build, root, leave_root)
         os.chroot(root)
         os.chdir("/")
         try:
-            decisions = [check(number, programs)
+            decisions = [check(number, *programs)
                          for number in range(int(seed), int(seed) + int(states))]
         finally:
-            programs.leave_root()
+            leave_root()
     missing = {"keep", "adopt", "drop", "reset", "fail"} - set(decisions)
     assert not missing, f"no state led to {missing}"
     print(f"{len(decisions)} states foretold")

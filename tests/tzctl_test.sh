@@ -48,13 +48,6 @@ mounted() { # FILE-OR-DIRECTORY PLACE MODE VERB: while the one lies over the oth
         umount $(grep -o " $PWD/root[^ ]*" /proc/mounts)
         exit $status' "$tzctl" "$@"
 }
-come_up() { # NAME: makes that directory while an update is on its way into its place
-    for _ in {1..500}; do
-        compgen -G "$s/tz/.tzctl.*" >/dev/null && break
-        sleep 0.01
-    done
-    sleep 0.3 && mkdir "$s/tz/$1"
-}
 in_order() { if ctl | grep -P '\x1b|.{81}|Problems'; then return 1; fi; echo fits; }
 coloured_lines() { env "$@" script -qec "'$tzctl' --root root" /dev/null | grep -c $'\e'; }
 told() { ctl status --json | jq -cr "$1"; }
@@ -72,7 +65,11 @@ failures=0
 # may be left that was not there before the command.
 while IFS='|' read -r about setup command status said after; do
     rm -rf "$work/now" && cp -a "$work/given" "$work/now" && cd "$work/now"
-    eval "$setup" >/dev/null
+    if ! eval "$setup" >/dev/null; then
+        [[ $setup == chattr* ]] || exit
+        echo "Not tested, for want of chattr: $about" >&2
+        continue
+    fi
     [ -n "$after" ] || after=$(left | xargs)
     (eval "$command") </dev/null >output 2>&1 && actual=0 || actual=$?
     [ "$actual" = "$status" ] && grep -qF -- "$said" output && [ "$(left | xargs)" = "$after" ] && continue
@@ -122,11 +119,11 @@ install||ctl install 2016h|0|adopts update 2016h|d d h b d e f g h
     root/var/db/timezone/tz: not a directory (a symbolic link
 - no updates|rm -r $s/tz|ctl install 2016h|1|root/var/db/timezone/tz: No such file
 - no state directory|rm -r $s|ctl install 2016h|1|tzctl: root/var/db/timezone/: No such file
-- an interruption||disturbed write,sendfile,copy_file_range:signal=INT:when=1 install 2016h|130|
+- an interruption||disturbed sendfile:signal=INT:when=1 install 2016h|130|nterrupted
 - a link that cannot be replaced||disturbed ?rename,?renameat,renameat2:error=EIO:when=2 install 2016h|1|
     root/var/db/timezone/tz_latest: Input/output error
-- a name that comes up meanwhile||come_up 2016h &
-    disturbed ?rename,?renameat,renameat2:delay_enter=600000:when=1 install 2016h|1|File exists|d d f b d e f g h
+- a name that comes up meanwhile||{ sleep 0.4; mkdir $s/tz/2016h; } &
+    disturbed ?rename,?renameat,renameat2:delay_enter=800000:when=1 install 2016h|1|tz/2016h: |d d f b d e f g h
 - where renaming has no flags||disturbed renameat2:error=EINVAL install 2016h|0|adopts|d d h b d e f g h
 - what cannot be brought onto the disk||disturbed ?sync,syncfs:error=EIO install 2016h|1|Input/output error
 - beside another||exec {lock}<>$s/.tzctl.lock; flock $lock; ctl install 2016h|1|another tzctl is running
@@ -146,8 +143,7 @@ use||ctl use 2016f|0|Current now: update 2016f.|f f f b d e f g
     ctl use 2016f; ls root/var/db|0|timezone|f f f b d e f g
 - a directory in a link's place|rm $s/icutz; mkdir -p $s/icutz/x|ctl use 2016f|1|root/var/db/timezone/icutz: 
 - a file in a link's place|rm $s/tz_latest; touch $s/tz_latest|
-    disturbed ?rename,?renameat,renameat2:error=EIO:when=2 use 2016f|1|Input/output error
-- a link that cannot be replaced||disturbed ?rename,?renameat,renameat2:error=EIO:when=2 use 2016f|1|root/var/db/
+    disturbed ?rename,?renameat,renameat2:error=EIO:when=2 use 2016f|1|root/var/db/timezone/
 - where renaming has no flags||disturbed renameat2:error=EINVAL use 2016f|0|2016f|f f f b d e f g
 - and a link cannot be replaced|rm $s/tz_latest; touch $s/tz_latest|
     disturbed "renameat2:error=EINVAL -e inject=?rename,renameat:error=EIO:when=3" use 2016f|1|output error
@@ -171,13 +167,12 @@ cleanup||ctl cleanup|0|Deleted update 2016g|d d f d f
 - a local time by too long a name|link $(printf %0300d 0) localtime|ctl cleanup --dry-run|0|Would delete update 2016b
 - a current link to nowhere|link nowhere zoneinfo|ctl cleanup|1|root/var/db/timezone/zoneinfo: names nothing
 - no latest link that can be read|rm $s/tz_latest; touch $s/tz_latest|ctl cleanup|1|root/var/db/timezone/tz_latest:
-- a link in the place of the updates|mv $s/tz root/; ln -s /tz $s/tz|ctl cleanup|1|timezone/tz: not a directory
 - an interruption||disturbed ?rename,?renameat,renameat2:signal=TERM:when=1 cleanup|143||d d f d e f g
 - what has a mount point in it, and others|mkdir $s/tz/2016b/x|mounted root/usr/share $s/tz/2016b/x rw cleanup|1|
     tzctl: root/var/db/timezone/tz/|d d f .tzctl.* d f
 - a mount point|cp -r root/usr/share/icu root/x; mkdir $s/tz/2016b/x|
     mounted root/x $s/tz/2016b/x rw cleanup; ls root/x|0|icutzformat.txt|d d f .tzctl.* d f
-- what cannot be read||disturbed openat,openat2:error=EIO:when=4+ cleanup|1|Input/output error
+- what cannot be read||disturbed getdents64:error=EIO:when=1+ cleanup|1|root/var/db/timezone
 status, in order||in_order|0|fits
 - coloured||coloured_lines NO_COLOR=|0|4
 - not coloured||coloured_lines NO_COLOR=1|1|0
@@ -192,6 +187,8 @@ status, in order||in_order|0|fits
 - what a start cannot replace|rm $s/localtime; touch $s/localtime|
     mounted root/usr/share/icu/icutzformat.txt $s/localtime rw status|0|create_symlink: from /var/db/timezone/localtime
 - a state directory that cannot be written to||mounted $s $s ro status|0|zoneinfo: Read-only file system
+- what chattr forbids to replace|chattr +i $s|ctl; chattr -i $s|0|zoneinfo: Operation not permitted
+- what chattr forbids to remove only|chattr +a $s|ctl; chattr -a $s|0|zoneinfo: File exists
 - a finding|rm $s/icutz|ctl|0|Problems
 - what is no update|touch $s/tz/note; mkdir $s/tz/.tzctl $s/tz/x; ln -s 2016g $s/tz/2016i|told '.installed[5]'|0|null
 - too large a number|mv $s/tz/{2016g,9999999999a}|
@@ -206,10 +203,12 @@ status, in order||in_order|0|fits
 - marker and record|touch $s/needs_cleanup; printf 2016c_2016d >$s/TZVersionDiffRecord|
     told '[.format, .marker, .record]'|0|[1,true,"2016c_2016d"]
 - a record elsewhere|ln -s /usr/share/icu/icutzformat.txt $s/TZVersionDiffRecord|told .record|0|null
-- a record that is a FIFO|mkfifo $s/TZVersionDiffRecord|told .record|0|null
+- a FIFO, whose writer goes on waiting|mkfifo $s/TZVersionDiffRecord; (: >$s/TZVersionDiffRecord; touch released) &|
+    told .record; ls released; cat $s/TZVersionDiffRecord|0|cannot access 'released'
 - a release elsewhere|ln -sf /usr/share/icu/icutzformat.txt $s/tz/2016g/zoneinfo/+VERSION|
     told .installed[0].release|0|null
-- a release without end|head -c 9999 /dev/zero >$s/tz/2016g/zoneinfo/+VERSION|told '.installed[0].release[4200:]'|0|
+- a release without end|printf %09999d 0 >$s/tz/2016g/zoneinfo/+VERSION|
+    told '.installed[0].release[5000:] == ""'|0|true
 - no current link that makes sense|link nowhere zoneinfo|told .findings[]|0|Bad zoneinfo link
 - a latest link to nowhere|link nowhere tz_latest|told .findings[]|0|The latest link leads nowhere.
 - an ICU link left behind|ctl use system; ln -s x $s/icutz|told .findings[]|0|The ICU link is left
@@ -222,7 +221,8 @@ status, in order||in_order|0|fits
 - no ICU link|rm $s/icutz|told .findings[]|0|The ICU link does not lead into the current update
 - no zone|link /var/db/timezone/zoneinfo/Europe localtime|told .findings[]|0|The local-time link leads to no compiled
 - a zone that is going|rm $s/tz/2016f/zoneinfo/Europe/Paris|told .findings[]|0|lacks the local zone
-- what cannot be read||disturbed openat,openat2:error=EMFILE:when=4+ status|1|: Too many open files
+- what cannot be read||disturbed getdents64:error=EIO status|1|Input/output error
+- what cannot be opened||disturbed openat:error=EMFILE:when=40+ status|1|: Too many open files
 - no local-time link|rm $s/localtime|told .findings[]|0|the next start makes it lead to /var/db/timezone/zoneinfo/Am
 - what only root can read|chmod 700 $s/tz/2016d|told .findings[2]|0|Only root can read what /var/db/timezone/loc
 - no compiled zone|echo x >$s/tz/2016d/zoneinfo/Europe/Paris|told .findings[]|0|leads to no compiled zone file: local
@@ -240,7 +240,7 @@ check||ctl check|0|TZDATA OK - update 2016d is current, the next start adopts up
 - old data|link @b/zoneinfo zoneinfo; link @b/icutz icutz|ctl check|1|TZDATA WARNING - The current update is older
 - a start that fails|rm $s/localtime; mkdir -p $s/localtime/x|ctl check|2|TZDATA CRITICAL - 
 - no zones|rm -r $s/tz/2016d/zoneinfo|ctl check|2|TZDATA CRITICAL - The current link leads to no zone file
-- what cannot be read||disturbed openat,openat2:error=EMFILE:when=4+ check|3|TZDATA UNKNOWN - 
+- what cannot be read||disturbed openat:error=EMFILE:when=40+ check|3|TZDATA UNKNOWN - 
 - no image||"$tzctl" --root nowhere check|3|TZDATA UNKNOWN - nowhere: No such file
 - wrong usage||ctl check --verbose|3|TZDATA UNKNOWN - 
 --help||ctl --help|0|Delete updates
