@@ -154,7 +154,7 @@ def run_in_turn(build, root, leave_root):
     which a static program does inside, where nothing else is."""
     def run(leave, *command):
         return subprocess.run(command, capture_output=True, timeout=60, check=False,
-                              preexec_fn=leave and leave_root)
+                              preexec_fn=leave_root if leave else None)
 
     tzctl, start = os.path.abspath(build + "/tzctl"), os.path.abspath(build + "/tests/tzreconcile")
     static = not os.path.exists(start)
