@@ -115,6 +115,8 @@ install||ctl install 2016h|0|adopts update 2016h|d d h b d e f g h
     echo $(stat -c %a $s/tz/2016h/{icutz,zoneinfo/Europe/Paris})|0|755 644|d d h b d e f g h
 - beside what is half-made|mkdir -p $s/tz/.tzctl.0/x $s/tz/.tzctl; touch $s/.tzctl.x|ctl install 2016h|0|adopts|
     d d h b d e f g h
+- beside what is only named alike|touch $s/.tzctlrc $s/tz/.tzctl-2 root/var/db/.tzctl_x|ctl install 2016h|0|adopts|
+    d d h .tzctl-2 b d e f g h .tzctl_x .tzctlrc
 - a link in the place of the updates|mv $s/tz root/; ln -s /tz $s/tz|ctl install 2016h|1|
     root/var/db/timezone/tz: not a directory (a symbolic link
 - no updates|rm -r $s/tz|ctl install 2016h|1|root/var/db/timezone/tz: No such file

@@ -365,8 +365,8 @@ bool remove(int directory, const std::string& name, const std::string& shown,
 }
 
 std::string temporary_name(const std::string& prefix) {
-    std::array<char, 10> digits{};
-    (void)std::snprintf(digits.data(), digits.size(), ".%08x", std::random_device()());
+    std::array<char, 9> digits{};
+    (void)std::snprintf(digits.data(), digits.size(), "%08x", std::random_device()());
     return prefix + digits.data();
 }
 

@@ -54,9 +54,9 @@ bool remove(int directory, const std::string& name, const std::string& shown,
             const std::function<void(const std::string&)>& failed);
 
 /// How the name of everything that is half-made or half-deleted begins.
-inline constexpr char half_made[] = ".tzctl";
+inline constexpr char half_made[] = ".tzctl.";
 
-/// A name that nobody can foresee: the prefix, a dot and 8 hexadecimal digits.
+/// A name that nobody can foresee: the prefix and 8 hexadecimal digits.
 [[nodiscard]] std::string temporary_name(const std::string& prefix = half_made);
 
 } // namespace tz::tree

@@ -25,7 +25,7 @@ namespace tz {
 namespace {
 
 constexpr char lock_name[] = ".tzctl.lock";
-constexpr char unfinished[] = ".tzctl.use";
+constexpr char unfinished[] = ".tzctl.use.";
 
 constexpr int directory_flags = O_RDONLY | O_DIRECTORY | O_CLOEXEC;
 
@@ -237,7 +237,7 @@ void work::remove_half_made() const {
         const int in = directory->number();
         tree::for_each_name(*directory, in_image(layout::state_directory), [&](const auto& name) {
             const bool is_note = name.starts_with(unfinished) && is_link(in, name);
-            if (name.starts_with(tree::half_made) && name != lock_name && !is_note) {
+            if ((name + ".").starts_with(tree::half_made) && name != lock_name && !is_note) {
                 (void)tree::remove(in, name, name, [](const std::string&) {});
             }
         });
