@@ -222,6 +222,7 @@ status, in order||in_order|0|fits
 - controls in an argument||ctl "$(printf '\033\342\200\256')"|2|\x1b\xe2\x80\xae
 - no ICU link|rm $s/icutz|told .findings[]|0|The ICU link does not lead into the current update
 - no zone|link /var/db/timezone/zoneinfo/Europe localtime|told .findings[]|0|The local-time link leads to no compiled
+- a zone with a slash at the end|link /var/db/timezone/zoneinfo/Europe/Paris/ localtime|told .links.localtime.state|0|dangling
 - a zone that is going|rm $s/tz/2016f/zoneinfo/Europe/Paris|told .findings[]|0|lacks the local zone
 - what cannot be read||disturbed getdents64:error=EIO status|1|Input/output error
 - what cannot be opened||disturbed openat:error=EMFILE:when=40+ status|1|: Too many open files

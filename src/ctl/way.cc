@@ -43,6 +43,7 @@ way follow(const std::string& path) {
     for (fs::descriptor at = open_root(); !rest.empty();) {
         const auto slash = std::min(rest.find('/'), rest.size());
         std::string name = slash == 0 ? "." : rest.substr(0, slash);
+        const bool before_slash = slash != rest.size();
         rest.erase(0, slash + 1);
         fs::descriptor next(::openat(at.number(), name.c_str(), O_PATH | O_NOFOLLOW | O_CLOEXEC));
         if (!next.is_open() && (is_missing() || errno == ENAMETOOLONG)) {
@@ -53,6 +54,9 @@ way follow(const std::string& path) {
         check(::fstat(next.number(), &status), shown);
         gone.passed.push_back({{status.st_dev, status.st_ino}, status.st_mode, ""});
         if (!S_ISLNK(status.st_mode)) {
+            if (before_slash && !S_ISDIR(status.st_mode)) {
+                return gone;
+            }
             gone.directory = std::exchange(at, std::move(next));
             gone.name = std::move(name);
             continue;
