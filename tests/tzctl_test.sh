@@ -167,7 +167,7 @@ cleanup||ctl cleanup|0|Deleted update 2016g|d d f d f
 - what a linked update passes|rm -r $s/tz/2016d; ln -s 2016g $s/tz/2016d; link tz/2016d/../2016b tz_latest|
     ctl cleanup|0|2016e|d d tz/2016d/../2016b b d g
 - a local time by too long a name|link $(printf %0300d 0) localtime|ctl cleanup --dry-run|0|Would delete update 2016b
-- a current link to nowhere|link nowhere zoneinfo|ctl cleanup|1|root/var/db/timezone/zoneinfo: names nothing
+- a current link to nowhere|link nowhere zoneinfo|ctl cleanup|1|root/var/db/timezone/zoneinfo: names no dataset
 - no latest link that can be read|rm $s/tz_latest; touch $s/tz_latest|ctl cleanup|1|root/var/db/timezone/tz_latest:
 - an interruption||disturbed ?rename,?renameat,renameat2:signal=TERM:when=1 cleanup|143||d d f d e f g
 - what has a mount point in it, and others|mkdir $s/tz/2016b/x|mounted root/usr/share $s/tz/2016b/x rw cleanup|1|
@@ -233,7 +233,7 @@ status, in order||in_order|0|fits
     told .findings|0|leads to no compiled zone file."
 - what programs read|mkdir root/etc; ln -s /var/db/timezone/localtime root/etc|
     told '[.readers[].follows]'|0|[false,true]
-- no state directory|rm -r $s|told .findings[0]|0|systemd-tmpfiles creates it
+- no state directory|rm -r $s|told .findings[0]|0|systemd-tmpfiles or the builder
 - older than the system's own data|link @b/zoneinfo zoneinfo|
     told .findings[]|0|"tzctl use system" makes that current
 - a line that every start writes|link @d tz_latest|ctl|0|This is usual

@@ -11,10 +11,11 @@
 namespace tz {
 
 /// What the caller wants compared: "system", "current", "latest", the version of an installed
-/// update, or a directory, which is what has a slash.
+/// update, or a directory, which must contain a slash.
 struct operand {
-    /// Opens a directory where the caller sees it, so before any other root directory is entered.
-    /// It holds an update, the system's own data, or zones themselves. Throws std::exception.
+    /// Opens a directory by the caller's path, so construct it before another root directory is
+    /// entered. The directory holds an update, the system's own data, or the zones themselves.
+    /// Throws std::exception.
     explicit operand(const std::string& word);
 
     std::string text;
@@ -32,12 +33,12 @@ struct comparison {
 };
 
 /// Compares two datasets from now on, for ten years: the current one and what the next start makes
-/// current; or the current one and the operand; or both operands. Leaves the image, as only outside
-/// of it there is a "/proc". Throws std::exception.
+/// current; or the current one and the operand; or both operands. Leaves the image, because it
+/// needs the machine's "/proc". Throws std::exception.
 [[nodiscard]] comparison compare(std::vector<operand> operands);
 
-/// What the next start means for clocks. Nothing if it changes no data, or if that cannot be told.
-/// Leaves the image, too.
+/// What the next start changes for clocks. Nothing if it changes no data, or if the datasets cannot
+/// be compared. Leaves the image, too.
 [[nodiscard]] std::optional<comparison> effect_of_next_start();
 
 } // namespace tz

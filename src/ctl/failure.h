@@ -6,11 +6,11 @@
 #include <string>
 #include <system_error>
 
-/// Everything that goes wrong is thrown as std::exception, whose text is of the form "what: why".
-/// `what` is mostly a path, as the caller of tzctl would type it.
+/// Every failure is thrown as std::exception, whose text has the form "what: why". `what` is
+/// usually a path, as the caller of tzctl would type it.
 namespace tz {
 
-/// Throws what `errno` says of `what` if `result`, as of a system call, is -1.
+/// Throws the error `errno`, about `what`, if `result`, as of a system call, is -1.
 inline void check(ssize_t result, const std::string& what) {
     if (result == -1) {
         throw std::system_error(errno, std::generic_category(), what);

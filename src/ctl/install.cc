@@ -36,7 +36,7 @@ fs::descriptor stage(const fs::descriptor& source, const std::string& shown, con
     auto staged = tree::open_directory(work.updates().number(), name, path);
     struct stat status {};
     if (!staged || ::fstat(staged->number(), &status) == -1 || status.st_uid != ::geteuid()) {
-        refuse(path, "somebody else has put something in its place");
+        refuse(path, "something else is in its place");
     }
     tree::copy(source, *staged, shown);
     check(::syncfs(staged->number()), path);

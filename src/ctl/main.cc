@@ -37,10 +37,10 @@ struct command_line {
     bool rehearsed = false;
 };
 
-// Becomes make-dataset, with these arguments.
+// Replaces this process by make-dataset, with these arguments.
 [[noreturn]] void make(std::vector<std::string> words) {
-    // From where this program is, as a prefix may be chosen as late as at the installation. A build
-    // directory holds both.
+    // Relative to this program, because the prefix may be chosen at installation. A build directory
+    // has both programs side by side.
     const auto here = files::read_symlink("/proc/self/exe").parent_path();
     std::string program = here / "make-dataset";
     if (!files::exists(program)) {
@@ -51,7 +51,7 @@ struct command_line {
         pointers.push_back(word.data());
     }
     pointers.push_back(nullptr);
-    (void)std::signal(SIGPIPE, SIG_DFL); // which is ignored here only
+    (void)std::signal(SIGPIPE, SIG_DFL); // tzctl ignores it; make-dataset must not
     ::execv(program.c_str(), pointers.data());
     throw std::system_error(errno, std::generic_category(), program);
 }
@@ -63,7 +63,7 @@ void enter_root_if_any(const std::string& root) {
     }
 }
 
-// The dataset is what the caller sees where the caller is, not in the image.
+// The dataset's path is the caller's, so it is opened before the image is entered.
 void install(const command_line& given) {
     const tz::fs::descriptor dataset(
         ::open(given.dataset.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
@@ -95,7 +95,8 @@ void declare(CLI::App& app, command_line& given) {
     app.fallthrough();
 
     app.add_subcommand("status", "Show what is current and what the next start does (default)");
-    auto* const diff = app.add_subcommand("diff", "Show which clocks the next start changes");
+    auto* const diff =
+        app.add_subcommand("diff", "Show which clocks the next start, or a dataset, changes");
     for (const char* name : {"FROM", "TO"}) {
         diff->add_option_function<std::string>(
                 name, [&](const std::string& word) { given.compared.push_back(word); },
@@ -106,7 +107,7 @@ void declare(CLI::App& app, command_line& given) {
     install->add_option("DATASET", given.dataset, "Directory that tzctl make has made")
         ->required()
         ->check(not_empty);
-    install->add_flag("--force", given.forced, "Install it even if no start would adopt it");
+    install->add_flag("--force", given.forced, "Install it despite objections, and print these");
     app.add_subcommand("check", "Print one line for a monitoring system");
     app.add_subcommand("use", "Make an installed update current now, and keep it")
         ->add_option("VERSION", given.version, "Its version; \"system\" for the system's own data")
@@ -114,7 +115,8 @@ void declare(CLI::App& app, command_line& given) {
         ->check(not_empty);
     app.add_subcommand("cleanup", "Delete updates that no link in the state directory uses")
         ->add_flag("--dry-run", given.rehearsed, "Only list what would be deleted");
-    app.add_subcommand("make", "Make a dataset: see make-dataset(8)")
+    app.add_subcommand("make", "Make a dataset: update|system TZDATA ICU DIRECTORY,\n"
+                               "as make-dataset(8) describes")
         ->prefix_command()
         ->fallthrough(false);
 }
@@ -184,7 +186,7 @@ int run(const CLI::App& app, const command_line& given) {
 }
 
 int refuse_usage(const CLI::App& app, const CLI::ParseError& error) {
-    if (error.get_exit_code() == 0) { // it is the help or the version that was asked for
+    if (error.get_exit_code() == 0) { // --help or --version
         return app.exit(error);
     }
     if (app.got_subcommand("check")) {

@@ -142,7 +142,7 @@ void add_problems_of_data(const survey& found, std::vector<std::string>& all) {
     const outcome& next = found.next_start.result;
     add(!updates::exists(layout::state_directory),
         std::string(layout::state_directory) +
-            " is missing: systemd-tmpfiles creates it at boot, or whoever builds the system.");
+            " is missing: systemd-tmpfiles or the builder of the system creates it.");
     for (const auto& data : found.installed) {
         add(!data.readable, why_unreadable(data));
     }

@@ -25,7 +25,7 @@ struct dataset {
     bool removable = false; // an update that is not in use
 };
 
-/// What to say of a dataset that is not readable.
+/// The finding on a dataset that is not readable.
 [[nodiscard]] inline std::string why_unreadable(const dataset& data) {
     return data.version + " is a version with a number beyond 2147483647.";
 }
@@ -65,18 +65,18 @@ struct survey {
     bool marker = false; // an update may be removed
     std::optional<std::string> record;
     prediction next_start;
-    std::vector<std::string> findings; // problems, then the warning lines of looking
+    std::vector<std::string> findings; // problems, then the warnings printed while looking
 };
 
 /// Looks at everything, and changes nothing. Throws std::exception if something cannot be looked
-/// at, so what is found missing is missing.
+/// at: what it reports as missing is missing, not unreadable.
 [[nodiscard]] survey look();
 
 /// The release of a component, such as "/zoneinfo", of a dataset: the word in its "+VERSION", or
 /// empty.
 [[nodiscard]] std::string release_in(const fs::descriptor& dataset, const std::string& component);
 
-/// What the current and the latest link name now, in the imagination.
+/// What the current and the latest link name now, in the simulation.
 [[nodiscard]] candidates look_at_candidates();
 
 } // namespace tz

@@ -11,8 +11,8 @@ namespace tz {
 /// hexadecimal digits. Ends after 4,096 bytes, with "..." then.
 [[nodiscard]] std::string in_utf8(const std::string& text);
 
-/// The same, with control and bidirectional characters written so, too: no name on the disk and no
-/// argument may steer a terminal.
+/// The same, with control and bidirectional characters escaped, too: no name on the disk and no
+/// argument may control a terminal.
 [[nodiscard]] std::string printable(const std::string& text);
 
 /// The columns that a printable text takes.
@@ -22,7 +22,7 @@ namespace tz {
 /// and 80 where there is no terminal; each after `indent` blanks.
 [[nodiscard]] std::string wrapped(const std::string& text, std::size_t indent = 0);
 
-/// What people call the dataset at `path`.
+/// A name for people of the dataset at `path`, such as "update 2016d.1.0".
 [[nodiscard]] std::string dataset_name(const std::string& path);
 
 /// What a start does, such as "adopts update 2016d.1.0".

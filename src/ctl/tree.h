@@ -7,10 +7,10 @@
 
 #include "fs/descriptor.h"
 
-/// Work on whole directories of which somebody else may be the owner, and may change them at the
-/// same time. Every step goes from a directory's descriptor to an entry of it, follows no symbolic
-/// link, and opens only regular files. `shown` is what messages call the directory. Failures are
-/// thrown as std::exception, also when something is not what it was a moment before.
+/// Work on whole directories that another user may own, and may change at the same time. Every step
+/// goes from a directory's descriptor to an entry of it, follows no symbolic link, and opens only
+/// regular files. `shown` is what messages call the directory. Failures are thrown as
+/// std::exception, also when something is not what it was a moment before.
 namespace tz::tree {
 
 /// Opens the directory at `path` beneath the open `directory`, through no symbolic link. Nothing if
@@ -24,9 +24,9 @@ void for_each_name(const fs::descriptor& directory, const std::string& shown,
 
 /// Copies everything below `source` into the empty directory `copy`, which only this user may
 /// change, with modes that let everybody read it. Refuses what cannot be part of a dataset: special
-/// files, files that only somebody else than the owner of `source` may read, more than 8 levels of
-/// directories, symbolic links that lead out of the directory or nowhere, and what changes during
-/// the copy.
+/// files, files of another owner than `source`'s that not every user may read, more than 8 levels
+/// of directories, symbolic links that lead out of the directory or nowhere, and what changes
+/// during the copy.
 void copy(const fs::descriptor& source, const fs::descriptor& copy, const std::string& shown);
 
 /// Whether both directories hold the same, byte for byte; owners, modes and times do not count.
@@ -40,7 +40,8 @@ void copy(const fs::descriptor& source, const fs::descriptor& copy, const std::s
 /// looks for a zone.
 [[nodiscard]] bool holds_zones(const fs::descriptor& zoneinfo, const std::string& shown);
 
-/// Calls `act` with the path of everything else than a directory, there, too.
+/// Calls `act` with the path of every entry that is not a directory, likewise outside of posix/ and
+/// right/.
 void for_each_zone_name(const fs::descriptor& zoneinfo, const std::string& shown,
                         const std::function<void(const std::string&)>& act);
 
@@ -53,10 +54,10 @@ void for_each_zone_name(const fs::descriptor& zoneinfo, const std::string& shown
 bool remove(int directory, const std::string& name, const std::string& shown,
             const std::function<void(const std::string&)>& failed);
 
-/// How the name of everything that is half-made or half-deleted begins.
+/// The prefix of the name of everything that is half-made or half-deleted.
 inline constexpr char half_made[] = ".tzctl.";
 
-/// A name that nobody can foresee: the prefix and 8 hexadecimal digits.
+/// An unpredictable name: the prefix and 8 hexadecimal digits.
 [[nodiscard]] std::string temporary_name(const std::string& prefix = half_made);
 
 } // namespace tz::tree

@@ -20,7 +20,7 @@
 namespace tz::updates {
 namespace {
 
-constexpr char unknown_use[] = "names nothing, so nobody knows which updates are in use";
+constexpr char unknown_use[] = "names no dataset, so it is unknown which updates are in use";
 
 std::vector<way> ways_in_use() {
     const auto current = target_of(layout::zoneinfo_link);

@@ -8,8 +8,8 @@
 #include "fs/descriptor.h"
 
 /// The installed updates: the directories in the directory of updates that are named by a version.
-/// Everything else there is nobody's business here. All of this looks at the real disk, and throws
-/// std::exception if that fails.
+/// Everything else there is ignored. All of this reads the real disk, not the simulation, and
+/// throws std::exception if that fails.
 namespace tz::updates {
 
 /// The path of the update of this version.
@@ -22,8 +22,8 @@ namespace tz::updates {
 [[nodiscard]] std::vector<std::string> installed(const fs::descriptor& directory);
 
 /// The versions of the installed updates that are not in use: no link of the state directory leads
-/// to them or through them. Throws also while the current or the latest link names nothing, as then
-/// nobody knows what is in use.
+/// to them or through them. Throws also if the current link names no dataset, or if the latest link
+/// is not a link, because it is then unknown what is in use.
 [[nodiscard]] std::vector<std::string> removable(const fs::descriptor& directory);
 
 /// Whether there is an entry, of any type, at the path.

@@ -6,7 +6,7 @@
 #include "ctl/work.h"
 #include "fs/descriptor.h"
 
-/// What tzctl can be asked to do. Every verb prints what it has done on standard output, and throws
+/// The verbs of tzctl. Every verb prints what it has done on standard output, and throws
 /// std::exception, whose text is for people, if it refuses or fails.
 namespace tz {
 
@@ -22,11 +22,12 @@ void install(const fs::descriptor& source, const std::string& shown, const std::
 /// what has no zone file. After a failure the links are as before.
 void use(const std::string& version);
 
-/// Completes the use of a version that was killed, as well as that is possible now.
+/// Completes a `use` that was killed, as far as that is possible now.
 void finish_interrupted_use(const work& work);
 
 /// Prints one line for a monitoring system, in the form of its plugins, and returns the exit status
-/// of a plugin: 0 if everything is fine, 1 for a warning, 2 if it is critical, 3 if nobody knows.
+/// of a plugin: 0 if everything is fine, 1 for a warning, 2 if it is critical, 3 if the state is
+/// unknown.
 [[nodiscard]] int print_check();
 
 /// The line and the status for what cannot be checked.

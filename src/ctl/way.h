@@ -26,7 +26,7 @@ struct way {
     fs::descriptor directory{-1}; // in which the last entry is,
     std::string name;             // under this name
 
-    /// Whether everybody can go it to the end, and read what is there.
+    /// Whether every user can follow it to its end, and read what is there.
     [[nodiscard]] bool is_open_to_others() const;
 
     [[nodiscard]] bool passes(const std::pair<dev_t, ino_t>& identity) const;
@@ -35,7 +35,7 @@ struct way {
     [[nodiscard]] bool leads_to_zone() const;
 };
 
-/// Goes along the absolute `path` as far as it leads. Throws std::system_error if something on the
+/// Follows the absolute `path` as far as it leads. Throws std::system_error if something on the
 /// way cannot be looked at.
 [[nodiscard]] way follow(const std::string& path);
 

@@ -15,7 +15,7 @@ struct wanted_link {
     std::optional<std::string> target;
 };
 
-/// Has the link replaced in the imagination. Throws what would forbid that on the disk.
+/// Replaces the link in the simulation. Throws the error that would prevent that on the disk.
 void imagine(const wanted_link& wanted);
 
 /// The version that a killed tzctl was about to make current.
@@ -23,7 +23,7 @@ void imagine(const wanted_link& wanted);
 
 /// As long as this lives, no other tzctl changes anything, and an interruption ends this one only
 /// where it asks for that. Everything half-made has a temporary name, and is removed at the
-/// beginning, whoever left it, and at the end. What cannot be removed is in nobody's way.
+/// beginning, whoever left it, and at the end. What cannot be removed does no harm.
 class work {
   public:
     /// Throws std::exception if another tzctl is running, or if the directory of updates is a

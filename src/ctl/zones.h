@@ -10,7 +10,7 @@
 
 namespace tz {
 
-/// What a clock shows beside the time of day, for example {3600, false, "CET"}.
+/// What a clock shows besides the time of day, for example {3600, false, "CET"}.
 struct local_type {
     long offset = 0; // seconds east of UTC
     bool daylight_saving = false;
