@@ -122,6 +122,9 @@ install||ctl install 2016h|0|adopts update 2016h|d d h b d e f g h
 - no updates|rm -r $s/tz|ctl install 2016h|1|root/var/db/timezone/tz: No such file
 - no state directory|rm -r $s|ctl install 2016h|1|tzctl: root/var/db/timezone/: No such file
 - an interruption||disturbed sendfile:signal=INT:when=1 install 2016h|130|nterrupted
+- a link that cannot be looked at|ln -s Europe 2016h/zoneinfo/x|disturbed openat2:error=EIO:when=1 install 2016h|1|
+    2016h/zoneinfo/x: Input/output error
+- whose effect cannot be told||disturbed memfd_create:error=EMFILE install 2016h|0|Too many open|d d h b d e f g h
 - a link that cannot be replaced||disturbed ?rename,?renameat,renameat2:error=EIO:when=2 install 2016h|1|
     root/var/db/timezone/tz_latest: Input/output error
 - a name that comes up meanwhile||{ sleep 0.4; mkdir $s/tz/2016h; } &
@@ -222,10 +225,14 @@ status, in order||in_order|0|fits
 - controls in an argument||ctl "$(printf '\033\342\200\256')"|2|\x1b\xe2\x80\xae
 - no ICU link|rm $s/icutz|told .findings[]|0|The ICU link does not lead into the current update
 - no zone|link /var/db/timezone/zoneinfo/Europe localtime|told .findings[]|0|The local-time link leads to no compiled
-- a zone with a slash at the end|link /var/db/timezone/zoneinfo/Europe/Paris/ localtime|told .links.localtime.state|0|dangling
+- a zone with a slash at the end|link /var/db/timezone/zoneinfo/Europe/Paris/ localtime|
+    told .links.localtime.state|0|dangling
 - a zone that is going|rm $s/tz/2016f/zoneinfo/Europe/Paris|told .findings[]|0|lacks the local zone
 - what cannot be read||disturbed getdents64:error=EIO status|1|Input/output error
 - what cannot be opened||disturbed openat:error=EMFILE:when=40+ status|1|: Too many open files
+- of ICU data, for once||disturbed "newfstatat:error=EIO:when=2 -P/var/db/timezone/tz/2016e/icutz" status|1|
+    2016e/icutz: Input/output error
+- what is only needed for clocks||disturbed memfd_create:error=EMFILE status|1|Too many open files
 - no local-time link|rm $s/localtime|told .findings[]|0|the next start makes it lead to /var/db/timezone/zoneinfo/Am
 - what only root can read|chmod 700 $s/tz/2016d|told .findings[2]|0|Only root can read what /var/db/timezone/loc
 - no compiled zone|echo x >$s/tz/2016d/zoneinfo/Europe/Paris|told .findings[]|0|leads to no compiled zone file: local

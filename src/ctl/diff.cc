@@ -148,6 +148,12 @@ std::optional<comparison> effect_of_next_start() try {
         return std::nullopt;
     }
     return compare_with_next(linked, start);
+} catch (const std::system_error& error) {
+    if (error.code() == std::errc::no_such_file_or_directory ||
+        error.code() == std::errc::function_not_supported) { // before Linux 5.6
+        return std::nullopt;
+    }
+    throw;
 } catch (const std::exception&) {
     return std::nullopt;
 }

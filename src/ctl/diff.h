@@ -37,8 +37,8 @@ struct comparison {
 /// needs the machine's "/proc". Throws std::exception.
 [[nodiscard]] comparison compare(std::vector<operand> operands);
 
-/// What the next start changes for clocks. Nothing if it changes no data, or if the datasets cannot
-/// be compared. Leaves the image, too.
+/// What the next start changes for clocks. Nothing if it changes no data, or if something for that
+/// is missing or refused. Throws other failures. Leaves the image, too.
 [[nodiscard]] std::optional<comparison> effect_of_next_start();
 
 } // namespace tz

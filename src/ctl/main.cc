@@ -164,7 +164,11 @@ int run(const CLI::App& app, const command_line& given) {
     }
     if (app.got_subcommand("install")) {
         install(given);
-        print_effect_if_any("");
+        try {
+            print_effect_if_any("");
+        } catch (const std::exception& error) { // it is installed all the same
+            std::cerr << "tzctl: " << tz::printable(error.what()) << '\n';
+        }
         return 0;
     }
     if (app.got_subcommand("diff")) {

@@ -387,6 +387,8 @@ FTSENT* platform::fts_read(FTS* walk) {
     if (found != nullptr &&
         (found->fts_info == FTS_DNR || found->fts_info == FTS_ERR || found->fts_info == FTS_NS)) {
         errno = found->fts_errno;
+    } else if (found != nullptr && found->fts_info == FTS_SLNONE) {
+        errno = EIO; // fts has lost the reason why the directory, which is no link, has no status
     }
     if (errno != 0) {
         note_failure(found == nullptr ? last_opened : found->fts_path);
