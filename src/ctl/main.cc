@@ -146,9 +146,12 @@ void refuse_combinations(const CLI::App& app, const command_line& given) {
     }
 }
 
-void print_effect_if_any(const char* before) {
-    if (const auto effect = tz::effect_of_next_start()) {
-        std::cout << before;
+void print_status() {
+    const auto found = tz::look();
+    const auto effect = tz::effect_of_next_start();
+    tz::print_for_people(found);
+    if (effect) {
+        std::cout << '\n';
         tz::print_effect(*effect);
     }
 }
@@ -165,7 +168,9 @@ int run(const CLI::App& app, const command_line& given) {
     if (app.got_subcommand("install")) {
         install(given);
         try {
-            print_effect_if_any("");
+            if (const auto effect = tz::effect_of_next_start()) {
+                tz::print_effect(*effect);
+            }
         } catch (const std::exception& error) { // it is installed all the same
             std::cerr << "tzctl: " << tz::printable(error.what()) << '\n';
         }
@@ -183,8 +188,7 @@ int run(const CLI::App& app, const command_line& given) {
     } else if (given.json) {
         tz::print_as_json(tz::look());
     } else {
-        tz::print_for_people(tz::look());
-        print_effect_if_any("\n");
+        print_status();
     }
     return 0;
 }
