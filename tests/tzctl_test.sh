@@ -231,7 +231,7 @@ status, in order||in_order|0|fits
 - what cannot be read||disturbed getdents64:error=EIO status|1|Input/output error
 - what cannot be opened||disturbed openat:error=EMFILE:when=40+ status|1|: Too many open files
 - of ICU data, for once||disturbed "newfstatat:error=EIO:when=2 -P/var/db/timezone/tz/2016e/icutz" status|1|
-    2016e/icutz: Input/output error
+    root/var/db/timezone/tz/2016e/icutz: Input/output error
 - what is only needed for clocks||disturbed memfd_create:error=EMFILE status|1|Too many open files
 - no local-time link|rm $s/localtime|told .findings[]|0|the next start makes it lead to /var/db/timezone/zoneinfo/Am
 - what only root can read|chmod 700 $s/tz/2016d|told .findings[2]|0|Only root can read what /var/db/timezone/loc

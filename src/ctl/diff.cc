@@ -128,7 +128,7 @@ operand::operand(const std::string& word) : text(word) {
 }
 
 comparison compare(std::vector<operand> operands) {
-    imagination::session imagined;
+    imagination::session imagined(in_image(""));
     const candidates linked = look_at_candidates();
     imagined.check();
     if (operands.empty()) {
@@ -141,7 +141,7 @@ comparison compare(std::vector<operand> operands) {
 }
 
 std::optional<comparison> effect_of_next_start() try {
-    imagination::session imagined;
+    imagination::session imagined(in_image(""));
     const candidates linked = look_at_candidates();
     const prediction start = predict_start(imagined);
     if (linked.current && linked.current->path == start.result.dataset) {

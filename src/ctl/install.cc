@@ -69,7 +69,7 @@ struct foresight {
 };
 
 foresight foresee(const std::string& place, const std::string& staged) {
-    imagination::session imagined;
+    imagination::session imagined(in_image(""));
     if (platform::access(place.c_str(), F_OK) == -1) {
         check(platform::symlink(staged.c_str(), place.c_str()), in_image(place));
     }

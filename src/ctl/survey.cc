@@ -221,7 +221,7 @@ survey look() {
     survey found;
     std::vector<std::string> warnings;
     {
-        imagination::session as_it_is;
+        imagination::session as_it_is(in_image(""));
         found.linked = look_at_candidates();
         found.installed = describe_installed();
         warnings = as_it_is.take_warnings();
@@ -234,7 +234,7 @@ survey look() {
     found.marker = follow(layout::cleanup_marker).leads_somewhere;
     found.record = beginning_of(AT_FDCWD, layout::version_diff_record);
     {
-        imagination::session imagined;
+        imagination::session imagined(in_image(""));
         found.next_start = predict_start(imagined);
     }
     found.zoneinfo_reader = describe_reader(layout::legacy_zoneinfo);

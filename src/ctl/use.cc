@@ -58,7 +58,7 @@ struct foresight {
 };
 
 foresight foresee(const std::vector<wanted_link>& wanted) {
-    imagination::session imagined;
+    imagination::session imagined(in_image(""));
     for (const auto& link : wanted) {
         imagine(link);
     }

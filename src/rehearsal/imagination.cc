@@ -238,7 +238,7 @@ int open_contents(const std::string& path) {
 
 } // namespace
 
-imagination::session::session() {
+imagination::session::session(std::string image) : image_(std::move(image)) {
     warnings.clear(); // of those who looked before
     former_new_handler = std::set_new_handler([] {
         unforeseen = ENOMEM;
@@ -269,7 +269,7 @@ std::vector<std::string> imagination::session::take_warnings() {
 
 void imagination::session::check() const {
     if (unforeseen != 0) {
-        throw std::system_error(unforeseen, std::generic_category(), unforeseen_at);
+        throw std::system_error(unforeseen, std::generic_category(), image_ + unforeseen_at);
     }
 }
 

@@ -20,7 +20,8 @@ namespace tz::imagination {
 /// at a time.
 class session {
   public:
-    session();
+    /// Failures are told with `image` before their paths.
+    explicit session(std::string image);
     session(const session&) = delete;
     session& operator=(const session&) = delete;
     ~session();
@@ -36,6 +37,9 @@ class session {
     /// by an error of the disk or a missing permission. The code that runs here may take that for
     /// an entry that is not there, so what it concluded is worth nothing then.
     void check() const;
+
+  private:
+    std::string image_;
 };
 
 } // namespace tz::imagination
