@@ -215,6 +215,7 @@ status, in order||in_order|0|fits
 - a release without end|printf %09999d 0 >$s/tz/2016g/zoneinfo/+VERSION|
     told '.installed[0].release[5000:] == ""'|0|true
 - no current link that makes sense|link nowhere zoneinfo|told .findings[]|0|Bad zoneinfo link
+- a current link by too long a name|link $(printf %0300d 0) zoneinfo|ctl check|2|TZDATA CRITICAL
 - a latest link to nowhere|link nowhere tz_latest|told .findings[]|0|The latest link leads nowhere.
 - an ICU link left behind|ctl use system; ln -s x $s/icutz|told .findings[]|0|The ICU link is left
 - the order of versions||told '.installed[0].version + .installed[4].version + .system.version'|0|2016g2016b2016c.1.0

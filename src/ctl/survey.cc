@@ -130,7 +130,8 @@ reader describe_reader(const char* path) {
 
 bool holds_zones(const std::string& zoneinfo) {
     const fs::descriptor directory(::open(zoneinfo.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-    check(directory.is_open() || is_missing() || errno == ELOOP ? 0 : -1, in_image(zoneinfo));
+    const bool nowhere = is_missing() || errno == ELOOP || errno == ENAMETOOLONG;
+    check(directory.is_open() || nowhere ? 0 : -1, in_image(zoneinfo));
     return directory.is_open() && tree::holds_zones(directory, in_image(zoneinfo));
 }
 
