@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: BSD-2-Clause
+#include <array>
 #include <iostream>
 
 #include "ctl/survey.h"
@@ -34,8 +35,9 @@ service_state state_of(const survey& found) {
 }
 
 int print(const service_state& state) {
-    constexpr const char* names[] = {"OK", "WARNING", "CRITICAL", "UNKNOWN"};
-    std::cout << "TZDATA " << names[state.status] << " - " << printable(state.text) << '\n';
+    constexpr std::array names{"OK", "WARNING", "CRITICAL", "UNKNOWN"};
+    std::cout << "TZDATA " << names.at(static_cast<std::size_t>(state.status)) << " - "
+              << printable(state.text) << '\n';
     return state.status;
 }
 

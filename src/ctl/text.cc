@@ -165,7 +165,7 @@ std::string reason(const outcome& start, const candidates& considered) {
         start.current == verdict::none ? system : considered.current.value_or(dataset());
     const dataset latest = considered.latest.value_or(dataset());
     const std::string about_current = on_current(start.current, current, system);
-    const std::string about_latest = on_latest(start.latest, latest, current, system);
+    std::string about_latest = on_latest(start.latest, latest, current, system);
     switch (start.decided) {
     case decision::keep:
     case decision::drop: return about_current + " " + about_latest;

@@ -323,8 +323,7 @@ void copy(const fs::descriptor& source, const fs::descriptor& copy, const std::s
 }
 
 bool equal(const fs::descriptor& one, const fs::descriptor& other, const std::string& shown) {
-    return has_everything_of(one, other, shown) &&
-           has_everything_of(other, one, shown); // NOLINT(*-suspicious-call-argument)
+    return has_everything_of(one, other, shown) && has_everything_of(other, one, shown);
 }
 
 bool is_zone(int directory, const std::string& name, const std::string& shown) {
