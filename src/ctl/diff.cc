@@ -20,8 +20,6 @@
 namespace tz {
 namespace {
 
-namespace files = std::filesystem;
-
 constexpr std::time_t ten_years = std::time_t{3652} * 24 * 60 * 60;
 
 // Compares, with a line on the terminal, if there is one, once it takes longer than a second.
@@ -52,11 +50,12 @@ zone_directory open_zones(const std::string& name, const std::string& path) {
 }
 
 zone_directory open_zones_in(const std::string& directory) {
-    std::error_code failure;
-    const std::string name = files::canonical(directory, failure).filename();
-    for (const std::string inside : {"/zoneinfo.default", "/zoneinfo"}) {
-        if (files::is_directory(directory + inside, failure)) {
-            return open_zones(name, directory + inside);
+    const std::string base = tree::own_name(directory);
+    const std::string& name = base.empty() ? directory : base;
+    for (const char* inside : {"zoneinfo.default", "zoneinfo"}) {
+        const std::string zones = std::filesystem::path(directory) / inside;
+        if (updates::exists(zones)) {
+            return open_zones(name, zones);
         }
     }
     return open_zones(name, directory);
@@ -95,17 +94,16 @@ zone_directory open_operand(operand& wanted, const candidates& linked) {
 
 comparison compare(const zone_directory& from, const zone_directory& to) {
     const std::time_t now = std::time(nullptr);
-    comparison done{from.name, to.name, now, now + ten_years, local_zone(), {}, {}};
+    comparison done{from.name, to.name, now, now + ten_years, local_zone(), {}, true, {}};
     leave_root();
     done.found = compare_visibly(from, to, done.start, done.end);
     return done;
 }
 
-// The zone of the local-time link, if the start replaces that by a link to another zone.
+// The zone of the local-time link, if the start replaces that.
 std::optional<std::string> next_local_zone(const prediction& start) {
-    const auto zone = zone_in(start.localtime.value_or(""));
-    const auto now = zone_in(updates::target_of(layout::localtime_link).value_or(""));
-    return zone == now ? std::nullopt : zone;
+    const bool stays = start.localtime == updates::target_of(layout::localtime_link);
+    return stays ? std::nullopt : zone_in(start.localtime.value_or(""));
 }
 
 comparison compare_with_next(const candidates& linked, const prediction& start) {
@@ -113,9 +111,11 @@ comparison compare_with_next(const candidates& linked, const prediction& start) 
         refuse("the next start", "fails");
     }
     const auto zone = next_local_zone(start);
+    const bool follows = local_time_follows();
     auto done = compare(open_linked(linked.current, layout::zoneinfo_link, linked),
                         open_zones_of(start.result.dataset, linked));
     done.next_local_zone = zone;
+    done.local_time_follows = follows;
     return done;
 }
 
@@ -143,11 +143,7 @@ comparison compare(std::vector<operand> operands) {
 std::optional<comparison> effect_of_next_start() try {
     imagination::session imagined(in_image(""));
     const candidates linked = look_at_candidates();
-    const prediction start = predict_start(imagined);
-    if (linked.current && linked.current->path == start.result.dataset) {
-        return std::nullopt;
-    }
-    return compare_with_next(linked, start);
+    return compare_with_next(linked, predict_start(imagined));
 } catch (const std::system_error& error) {
     if (error.code() == std::errc::no_such_file_or_directory ||
         error.code() == std::errc::function_not_supported) { // before Linux 5.6

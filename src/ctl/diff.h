@@ -28,7 +28,8 @@ struct comparison {
     std::time_t start = 0; // inclusive
     std::time_t end = 0;   // exclusive
     std::optional<std::string> local_zone;
-    std::optional<std::string> next_local_zone; // if the next start sets another
+    std::optional<std::string> next_local_zone; // if the next start replaces the local-time link
+    bool local_time_follows = true;             // the data that is compared
     zone_differences found;
 };
 
@@ -37,8 +38,8 @@ struct comparison {
 /// needs the machine's "/proc". Throws std::exception.
 [[nodiscard]] comparison compare(std::vector<operand> operands);
 
-/// What the next start changes for clocks. Nothing if it changes no data, or if something for that
-/// is missing or refused. Throws other failures. Leaves the image, too.
+/// What the next start changes for clocks. Nothing if something for that is missing or refused.
+/// Throws other failures. Leaves the image, too.
 [[nodiscard]] std::optional<comparison> effect_of_next_start();
 
 } // namespace tz

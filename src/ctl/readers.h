@@ -6,10 +6,19 @@
 
 namespace tz {
 
+inline constexpr char etc_localtime[] = "/etc/localtime";
+
 /// The machine's zone, such as "Europe/Paris": what follows ".../zoneinfo.../" in the first target
 /// that names one on the way from /etc/localtime, or else from the local-time link. Nothing if
 /// neither names a zone.
 [[nodiscard]] std::optional<std::string> local_zone();
+
+/// Whether the current link is on the way from `path`.
+[[nodiscard]] bool leads_through_current_link(const std::string& path);
+
+/// Whether local time is read through the current link: from /etc/localtime or, where that does not
+/// exist, from the local-time link.
+[[nodiscard]] bool local_time_follows();
 
 /// The zone that a link's target names in that form.
 [[nodiscard]] std::optional<std::string> zone_in(const std::string& target);

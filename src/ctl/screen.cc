@@ -116,6 +116,9 @@ std::string effect_on_local_time(const comparison& done) {
         return "Local time: no link names the local zone.";
     }
     const std::string subject = "Local time, " + *done.local_zone + ", ";
+    if (!done.local_time_follows) {
+        return subject + "does not change: it is not read through the current link.";
+    }
     if (!std::binary_search(zones.begin(), zones.end(), *done.local_zone)) {
         return subject + "cannot be compared: a dataset lacks a valid file of it.";
     }
@@ -132,7 +135,9 @@ std::string effect_on_local_time(const comparison& done) {
 
 void print_for_people(const survey& found) {
     const prediction& next = found.next_start;
-    print_title("The next start " + printable(headline(next.result)) + ".");
+    std::string title = wrapped("The next start " + headline(next.result) + ".");
+    title.pop_back();
+    print_title(title);
     std::cout << wrapped(reason(next.result, found.linked), 2);
     if (!next.warnings.empty()) {
         std::cout << '\n';

@@ -122,10 +122,7 @@ link describe_link(const char* path) {
 }
 
 reader describe_reader(const char* path) {
-    struct stat current {};
-    const bool has_current = ::lstat(layout::zoneinfo_link, &current) == 0;
-    const way there = follow(path);
-    return {describe_link(path), has_current && there.passes({current.st_dev, current.st_ino})};
+    return {describe_link(path), leads_through_current_link(path)};
 }
 
 bool holds_zones(const std::string& zoneinfo) {
@@ -239,7 +236,7 @@ survey look() {
         found.next_start = predict_start(imagined);
     }
     found.zoneinfo_reader = describe_reader(layout::legacy_zoneinfo);
-    found.etc_localtime = describe_reader("/etc/localtime");
+    found.etc_localtime = describe_reader(etc_localtime);
     found.local_zone = local_zone();
     found.current_has_zones = holds_zones(layout::zoneinfo_link);
     add_problems_of_data(found, found.findings);

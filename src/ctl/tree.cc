@@ -6,6 +6,7 @@
 #include <cerrno>
 #include <climits>
 #include <cstdio>
+#include <filesystem>
 #include <memory>
 #include <random>
 #include <sstream>
@@ -296,6 +297,15 @@ std::optional<fs::descriptor> open_directory(int directory, const std::string& p
         }
     }
     return at;
+}
+
+std::string own_name(const std::string& directory) {
+    std::error_code failure;
+    const auto path = std::filesystem::canonical(directory, failure);
+    if (failure) {
+        throw std::system_error(failure, directory);
+    }
+    return path.filename();
 }
 
 void for_each_name(const fs::descriptor& directory, const std::string& shown,

@@ -18,6 +18,9 @@ namespace tz::tree {
 [[nodiscard]] std::optional<fs::descriptor> open_directory(int directory, const std::string& path,
                                                            const std::string& shown);
 
+/// The last element of the path of `directory` without symbolic links; empty for "/".
+[[nodiscard]] std::string own_name(const std::string& directory);
+
 /// Calls `act` with the name of every entry of the open `directory`.
 void for_each_name(const fs::descriptor& directory, const std::string& shown,
                    const std::function<void(const std::string&)>& act);
