@@ -92,8 +92,9 @@ install||ctl install 2016h|0|adopts update 2016h|d d h b d e f g h
 - no zones, by force|rm -r 2016h/zoneinfo|ctl install --force 2016h|0|holds no zone|d d h b d e f g h
 - zones in posix and right only|mv 2016h/zoneinfo new; mkdir 2016h/zoneinfo; cp -r new 2016h/zoneinfo/right;
     mv new 2016h/zoneinfo/posix|ctl install 2016h|1|holds no zone
-- no version as a name|mv 2016h 2016H|ctl install 2016H|1|2016H: not a version
-- a hidden name, by force|mv 2016h .2016h|ctl install --force .2016h|1|.2016h: not a version
+- no version as a name|mv 2016h 2016H|ctl install 2016H|1|2016H: its name is not a version
+- the root directory||ctl install /|1|tzctl: /: its name
+- a hidden name, by force|mv 2016h .2016h|ctl install --force .2016h|1|.2016h: its name
 - too large a number|mv 2016h 20160000000h|ctl install 20160000000h|1|a number beyond 2147483647
 - again|ctl install 2016h; link @f tz_latest|ctl install 2016h|0|installed already|d d h b d e f g h
 - other data again|ctl install 2016h; printf x >>2016h/zoneinfo/Europe/Paris|ctl install --force 2016h|1|
@@ -184,6 +185,9 @@ status, in order||in_order|0|fits
 - of the latest update||ctl|0|yes        yes   latest
 - of what is not in use||ctl|0|yes        no    may be removed
 - printed to nowhere||ctl status >/dev/full|1|standard output
+- at the end, local time||ctl|0|Local time, Europe/Paris, 
+- local time by a link of its own|mkdir root/etc; ln -s /usr/share/zoneinfo.default/UTC root/etc/localtime|ctl|0|
+    Local time, UTC, does not change: it is not
 - what a start writes|link nowhere zoneinfo|told .next_start.warnings[0]|0|Bad zoneinfo link nowhere
 - a verdict|link @e tz_latest|told '[.next_start["current", "latest"]]'|0|["fits","other schema"]
 - a reason that only now holds|rm -r $s/tz/2016g/icutz; ln -s ../../icutz $s/tz/2016g/icutz; link @g tz_latest|
@@ -247,9 +251,11 @@ status, in order||in_order|0|fits
 - a line that every start writes|link @d tz_latest|ctl|0|This is usual
 - as JSON||ctl --json|0|"format": 1
 check||ctl check|0|TZDATA OK - update 2016d is current, the next start adopts update 2016f
-- a finding|rm $s/icutz $s/localtime|ctl check|1|TZDATA WARNING - The ICU link does not lead into
+- findings|rm $s/icutz $s/localtime|ctl check|1|
+    TZDATA WARNING - The ICU link does not lead into the current update: "tzctl use" corrects that (and 1 more)
 - old data|link @b/zoneinfo zoneinfo; link @b/icutz icutz|ctl check|1|TZDATA WARNING - The current update is older
 - a start that fails|rm $s/localtime; mkdir -p $s/localtime/x|ctl check|2|TZDATA CRITICAL - 
+- printed to nowhere||ctl check >&-|3|standard output
 - no zones|rm -r $s/tz/2016d/zoneinfo|ctl check|2|TZDATA CRITICAL - The current link leads to no zone file
 - what cannot be read||disturbed openat:error=EMFILE:when=40+ check|3|TZDATA UNKNOWN - 
 - no image||"$tzctl" --root nowhere check|3|TZDATA UNKNOWN - nowhere: No such file
@@ -258,6 +264,7 @@ check||ctl check|0|TZDATA OK - update 2016d is current, the next start adopts up
 --version, printed to nowhere||ctl --version >&-|1|standard output
 no operand||ctl use|2|tzctl: VERSION
 no image||"$tzctl" --root "" cleanup|2|--root
+- and no word for it||"$tzctl" --root= cleanup|2|--root: an empty text
 - one that is not there||"$tzctl" --root nowhere cleanup|1|tzctl: nowhere: No such file
 no verb||ctl frobnicate|2|frobnicate
 an option of another verb||ctl install --json 2016h|2|--json

@@ -9,6 +9,8 @@
 namespace tz {
 namespace {
 
+constexpr int unknown = 3;
+
 struct service_state {
     int status;
     std::string text;
@@ -16,7 +18,9 @@ struct service_state {
 
 std::string first_of(const std::vector<std::string>& findings) {
     const auto more = findings.size() - 1;
-    return findings.front() + (more == 0 ? "" : " (and " + std::to_string(more) + " more)");
+    const std::string& first = findings.front();
+    return first.substr(0, first.size() - (first.ends_with('.') ? 1 : 0)) +
+           (more == 0 ? "" : " (and " + std::to_string(more) + " more)");
 }
 
 service_state state_of(const survey& found) {
@@ -38,7 +42,7 @@ int print(const service_state& state) {
     constexpr std::array names{"OK", "WARNING", "CRITICAL", "UNKNOWN"};
     std::cout << "TZDATA " << names.at(static_cast<std::size_t>(state.status)) << " - "
               << printable(state.text) << '\n';
-    return state.status;
+    return std::cout.flush() ? state.status : unknown;
 }
 
 } // namespace
@@ -52,7 +56,7 @@ int print_check() {
 }
 
 int print_unknown(const std::string& why) {
-    return print({3, why});
+    return print({unknown, why});
 }
 
 } // namespace tz

@@ -21,9 +21,9 @@
 namespace tz {
 namespace {
 
-void check_name(const std::string& version, bool forced) {
+void check_name(const std::string& version, const std::string& shown, bool forced) {
     if (version.empty() || version[0] == '.' || !(forced || split_version(version))) {
-        refuse(version, "not a version such as 2016b.1.0");
+        refuse(shown, "its name is not a version such as 2016b.1.0");
     }
 }
 
@@ -123,7 +123,7 @@ void publish(const std::string& version, const std::string& staged, const work& 
 
 void install(const fs::descriptor& source, const std::string& shown, const std::string& version,
              bool forced) {
-    check_name(version, forced);
+    check_name(version, shown, forced);
     const work work;
     finish_interrupted_use(work);
     const std::string staged_name = tree::temporary_name();

@@ -1,11 +1,11 @@
 // SPDX-License-Identifier: BSD-2-Clause
+#include <algorithm>
 #include <cerrno>
 #include <csignal>
-#include <cstdlib>
 #include <filesystem>
 #include <iostream>
-#include <memory>
 #include <string>
+#include <string_view>
 #include <system_error>
 #include <vector>
 
@@ -18,6 +18,7 @@
 #include "ctl/printers.h"
 #include "ctl/root.h"
 #include "ctl/text.h"
+#include "ctl/tree.h"
 #include "ctl/verbs.h"
 #include "fs/descriptor.h"
 #include "platform/process.h"
@@ -68,11 +69,9 @@ void install(const command_line& given) {
     const tz::fs::descriptor dataset(
         ::open(given.dataset.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     tz::check(dataset.number(), given.dataset);
-    const std::unique_ptr<char, decltype(&std::free)> whole(
-        ::realpath(given.dataset.c_str(), nullptr), std::free);
-    tz::check(whole ? 0 : -1, given.dataset);
+    const std::string version = tz::tree::own_name(given.dataset);
     enter_root_if_any(given.root);
-    tz::install(dataset, given.dataset, files::path(whole.get()).filename(), given.forced);
+    tz::install(dataset, given.dataset, version, given.forced);
 }
 
 void diff(const command_line& given) {
@@ -210,6 +209,9 @@ int parse_and_run(int count, char** words) {
     command_line given;
     declare(app, given);
     try {
+        if (std::count(words, words + count, std::string_view("--root=")) != 0) {
+            throw CLI::ValidationError("--root", "an empty text"); // not the next word
+        }
         app.parse(count, words);
         return run(app, given);
     } catch (const CLI::ParseError& error) {
@@ -229,7 +231,7 @@ int main(int count, char** words) {
     }
     if (!std::cout.flush()) { // what was printed may still be lost
         std::cerr << "tzctl: cannot write to standard output\n";
-        status = 1;
+        status = std::max(status, 1);
     }
     tz::interruption::end_process_if_any();
     return status;
