@@ -3,8 +3,6 @@
 #include <iomanip>
 #include <iostream>
 
-#include <fcntl.h>
-
 #include "ctl/failure.h"
 #include "ctl/interruption.h"
 #include "ctl/root.h"
@@ -13,6 +11,7 @@
 #include "ctl/updates.h"
 #include "ctl/verbs.h"
 #include "ctl/work.h"
+#include "fs/layout.h"
 #include "rehearsal/kernel.h"
 
 namespace tz {
@@ -25,10 +24,8 @@ void report(const std::string& path) {
 
 double size_of(const fs::descriptor& updates, const std::string& version) {
     const std::string shown = in_image(updates::path_of(version));
-    const fs::descriptor update(::openat(updates.number(), version.c_str(),
-                                         O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
-    check(update.number(), shown);
-    return tree::size(update, shown);
+    const auto update = tree::open_directory(updates.number(), version, shown);
+    return update ? tree::size(*update, shown) : 0;
 }
 
 // A reader finds all of the update or nothing.
@@ -81,9 +78,7 @@ bool delete_unused(const fs::descriptor& updates, bool rehearsed) {
 
 bool clean_up(bool rehearsed) {
     if (rehearsed) {
-        const auto updates = updates::open_directory();
-        check(updates ? 0 : -1, in_image(updates::path_of("")));
-        return delete_unused(*updates, rehearsed);
+        return delete_unused(tree::open(layout::updates_directory), rehearsed);
     }
     const work work;
     finish_interrupted_use(work);

@@ -5,7 +5,6 @@
 #include <filesystem>
 #include <iostream>
 
-#include <fcntl.h>
 #include <unistd.h>
 
 #include "ctl/failure.h"
@@ -41,8 +40,7 @@ zone_differences compare_visibly(const zone_directory& from, const zone_director
 }
 
 zone_directory open_zones(const std::string& name, const std::string& path) {
-    fs::descriptor directory(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-    check(directory.number(), in_image(path));
+    auto directory = tree::open(path);
     if (!tree::holds_zones(directory, in_image(path))) {
         refuse(in_image(path), "holds no zone file");
     }
@@ -106,7 +104,8 @@ std::optional<std::string> next_local_zone(const prediction& start) {
     return stays ? std::nullopt : zone_in(start.localtime.value_or(""));
 }
 
-comparison compare_with_next(const candidates& linked, const prediction& start) {
+comparison compare_with_next(const foresight& next) {
+    const auto& [linked, start] = next;
     if (start.result.decided == decision::fail) {
         refuse("the next start", "fails");
     }
@@ -128,12 +127,11 @@ operand::operand(const std::string& word) : text(word) {
 }
 
 comparison compare(std::vector<operand> operands) {
-    imagination::session imagined(in_image(""));
-    const candidates linked = look_at_candidates();
-    imagined.check();
+    const auto next = foresee({});
     if (operands.empty()) {
-        return compare_with_next(linked, predict_start(imagined));
+        return compare_with_next(next);
     }
+    const auto& linked = next.considered;
     const auto from = operands.size() == 1
                           ? open_linked(linked.current, layout::zoneinfo_link, linked)
                           : open_operand(operands.front(), linked);
@@ -141,9 +139,7 @@ comparison compare(std::vector<operand> operands) {
 }
 
 std::optional<comparison> effect_of_next_start() try {
-    imagination::session imagined(in_image(""));
-    const candidates linked = look_at_candidates();
-    return compare_with_next(linked, predict_start(imagined));
+    return compare_with_next(foresee({}));
 } catch (const std::system_error& error) {
     if (error.code() == std::errc::no_such_file_or_directory ||
         error.code() == std::errc::function_not_supported) { // before Linux 5.6

@@ -15,7 +15,6 @@
 #include "ctl/verbs.h"
 #include "ctl/work.h"
 #include "fs/layout.h"
-#include "platform/disk.h"
 #include "rehearsal/kernel.h"
 
 namespace tz {
@@ -60,22 +59,6 @@ bool has_zones(const fs::descriptor& dataset, const std::string& shown) {
     const std::string zoneinfo = layout::update_zoneinfo + 1;
     const auto directory = tree::open_directory(dataset.number(), zoneinfo, shown);
     return directory && tree::holds_zones(*directory, shown + "/" + zoneinfo);
-}
-
-// What a start does once the latest link names `place`, where the update is, or will be.
-struct foresight {
-    candidates considered;
-    prediction start;
-};
-
-foresight foresee(const std::string& place, const std::string& staged) {
-    imagination::session imagined(in_image(""));
-    if (platform::access(place.c_str(), F_OK) == -1) {
-        check(platform::symlink(staged.c_str(), place.c_str()), in_image(place));
-    }
-    imagine({layout::latest_link, place});
-    candidates considered = look_at_candidates();
-    return {std::move(considered), predict_start(imagined)};
 }
 
 bool is_older(const std::string& release, const std::string& than) {
@@ -131,7 +114,11 @@ void install(const fs::descriptor& source, const std::string& shown, const std::
     const bool installed = is_installed(version, staged, work);
 
     const std::string place = updates::path_of(version);
-    const auto next = foresee(place, updates::path_of(staged_name));
+    std::vector<wanted_link> wanted{{layout::latest_link, place}};
+    if (!installed) {
+        wanted.push_back({place, updates::path_of(staged_name)});
+    }
+    const auto next = foresee(wanted);
     const std::string against = objection(next, version, staged, shown);
     if (!against.empty() && !forced) {
         refuse(shown, against);

@@ -10,7 +10,6 @@
 #include <vector>
 
 #include <CLI/CLI.hpp>
-#include <fcntl.h>
 #include <unistd.h>
 
 #include "ctl/failure.h"
@@ -66,9 +65,7 @@ void enter_root_if_any(const std::string& root) {
 
 // The dataset's path is the caller's, so it is opened before the image is entered.
 void install(const command_line& given) {
-    const tz::fs::descriptor dataset(
-        ::open(given.dataset.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-    tz::check(dataset.number(), given.dataset);
+    const auto dataset = tz::tree::open(given.dataset);
     const std::string version = tz::tree::own_name(given.dataset);
     enter_root_if_any(given.root);
     tz::install(dataset, given.dataset, version, given.forced);

@@ -7,7 +7,6 @@
 #include <stdexcept>
 
 #include <fcntl.h>
-#include <sys/stat.h>
 #include <unistd.h>
 
 #include "ctl/failure.h"
@@ -16,7 +15,6 @@
 #include "ctl/tree.h"
 #include "ctl/updates.h"
 #include "ctl/way.h"
-#include "ctl/work.h"
 #include "dataset/kiv_dataset.h"
 #include "fs/layout.h"
 #include "rehearsal/regular_file.h"
@@ -76,7 +74,7 @@ std::optional<dataset> describe(const std::string& path, const std::optional<kiv
     if (path.empty()) {
         found.release = found.version.substr(0, found.version.rfind(".1.0"));
         found.icu_release = word_in(AT_FDCWD, layout::system_icu + version_file);
-    } else if (const auto updates = updates::open_directory()) {
+    } else if (const auto updates = tree::open_if_any(layout::updates_directory)) {
         if (const auto update = tree::open_directory(updates->number(), found.version, path)) {
             found.release = release_in(*update, layout::update_zoneinfo);
             found.icu_release = release_in(*update, layout::update_icu);
@@ -87,7 +85,7 @@ std::optional<dataset> describe(const std::string& path, const std::optional<kiv
 
 std::vector<dataset> describe_installed() {
     std::vector<dataset> all;
-    const auto directory = updates::open_directory();
+    const auto directory = tree::open_if_any(layout::updates_directory);
     if (!directory) {
         return all;
     }
@@ -125,13 +123,6 @@ reader describe_reader(const char* path) {
     return {describe_link(path), leads_through_current_link(path)};
 }
 
-bool holds_zones(const std::string& zoneinfo) {
-    const fs::descriptor directory(::open(zoneinfo.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-    const bool nowhere = is_missing() || errno == ELOOP || errno == ENAMETOOLONG;
-    check(directory.is_open() || nowhere ? 0 : -1, in_image(zoneinfo));
-    return directory.is_open() && tree::holds_zones(directory, in_image(zoneinfo));
-}
-
 // What is wrong with the data.
 void add_problems_of_data(const survey& found, std::vector<std::string>& all) {
     const auto add = [&](bool holds, const std::string& problem) {
@@ -145,7 +136,7 @@ void add_problems_of_data(const survey& found, std::vector<std::string>& all) {
         add(!data.readable, why_unreadable(data));
     }
     add(!found.linked.system, "No start can use the system's own data.");
-    add(!holds_zones(layout::system_zoneinfo),
+    add(!tree::holds_zones(layout::system_zoneinfo),
         std::string("There is no zone file in ") + layout::system_zoneinfo + ".");
     add(!found.current_has_zones,
         "The current link leads to no zone file: programs that follow it show UTC for every zone.");
@@ -190,15 +181,7 @@ void add_problems_of_links(const survey& found, std::vector<std::string>& all) {
     }
 }
 
-} // namespace
-
-// Unlike a start's own way to the word, this one leads out of no dataset, since the word is
-// printed.
-std::string release_in(const fs::descriptor& dataset, const std::string& component) {
-    const auto directory = tree::open_directory(dataset.number(), component.substr(1), component);
-    return directory ? word_in(directory->number(), version_file.substr(1)) : "";
-}
-
+// What the current and the latest link name now, in the simulation.
 candidates look_at_candidates() {
     const auto path_or_none = [](std::string (*read)()) -> std::optional<std::string> {
         try {
@@ -213,6 +196,24 @@ candidates look_at_candidates() {
     return {system ? describe("", system) : std::nullopt,
             current ? describe(*current, system) : std::nullopt,
             latest && !latest->empty() ? describe(*latest, system) : std::nullopt};
+}
+
+} // namespace
+
+// Unlike a start's own way to the word, this one leads out of no dataset, since the word is
+// printed.
+std::string release_in(const fs::descriptor& dataset, const std::string& component) {
+    const auto directory = tree::open_directory(dataset.number(), component.substr(1), component);
+    return directory ? word_in(directory->number(), version_file.substr(1)) : "";
+}
+
+foresight foresee(const std::vector<wanted_link>& wanted) {
+    imagination::session imagined(in_image(""));
+    for (const auto& link : wanted) {
+        imagine(link);
+    }
+    candidates considered = look_at_candidates();
+    return {std::move(considered), predict_start(imagined)};
 }
 
 survey look() {
@@ -238,7 +239,7 @@ survey look() {
     found.zoneinfo_reader = describe_reader(layout::legacy_zoneinfo);
     found.etc_localtime = describe_reader(etc_localtime);
     found.local_zone = local_zone();
-    found.current_has_zones = holds_zones(layout::zoneinfo_link);
+    found.current_has_zones = tree::holds_zones(layout::zoneinfo_link);
     add_problems_of_data(found, found.findings);
     add_problems_of_links(found, found.findings);
     found.findings.insert(found.findings.end(), warnings.begin(), warnings.end());

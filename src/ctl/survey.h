@@ -5,6 +5,7 @@
 #include <string>
 #include <vector>
 
+#include "ctl/work.h"
 #include "fs/descriptor.h"
 #include "rehearsal/prediction.h"
 #include "version/data_version.h"
@@ -76,7 +77,13 @@ struct survey {
 /// empty.
 [[nodiscard]] std::string release_in(const fs::descriptor& dataset, const std::string& component);
 
-/// What the current and the latest link name now, in the simulation.
-[[nodiscard]] candidates look_at_candidates();
+/// What the next start does once these links are replaced, and the datasets that it considers.
+struct foresight {
+    candidates considered;
+    prediction start;
+};
+
+/// Throws std::system_error if a link cannot be replaced, or if a look at the disk fails.
+[[nodiscard]] foresight foresee(const std::vector<wanted_link>& wanted);
 
 } // namespace tz

@@ -20,6 +20,7 @@
 
 #include "ctl/failure.h"
 #include "ctl/interruption.h"
+#include "ctl/root.h"
 #include "rehearsal/kernel.h"
 #include "rehearsal/regular_file.h"
 
@@ -281,6 +282,21 @@ class remover {
 
 } // namespace
 
+fs::descriptor open(const std::string& path) {
+    fs::descriptor directory(::open(path.c_str(), directory_flags));
+    check(directory.number(), in_image(path));
+    return directory;
+}
+
+std::optional<fs::descriptor> open_if_any(const std::string& path) {
+    fs::descriptor directory(::open(path.c_str(), directory_flags));
+    if (!directory.is_open() && is_missing()) {
+        return std::nullopt;
+    }
+    check(directory.number(), in_image(path));
+    return directory;
+}
+
 std::optional<fs::descriptor> open_directory(int directory, const std::string& path,
                                              const std::string& shown) {
     std::optional<fs::descriptor> at;
@@ -355,6 +371,13 @@ bool holds_zones(const fs::descriptor& zoneinfo, const std::string& shown) {
         return S_ISREG(entry.status.st_mode) &&
                is_zone(entry.directory, entry.name, shown + "/" + entry.path);
     });
+}
+
+bool holds_zones(const std::string& zoneinfo) {
+    const fs::descriptor directory(::open(zoneinfo.c_str(), directory_flags));
+    const bool nowhere = is_missing() || errno == ELOOP || errno == ENAMETOOLONG;
+    check(directory.is_open() || nowhere ? 0 : -1, in_image(zoneinfo));
+    return directory.is_open() && holds_zones(directory, in_image(zoneinfo));
 }
 
 void for_each_zone_name(const fs::descriptor& zoneinfo, const std::string& shown,

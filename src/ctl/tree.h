@@ -13,6 +13,12 @@
 /// std::exception, also when something is not what it was a moment before.
 namespace tz::tree {
 
+/// Opens the directory at `path`, and follows links.
+[[nodiscard]] fs::descriptor open(const std::string& path);
+
+/// The same, or nothing if there is none.
+[[nodiscard]] std::optional<fs::descriptor> open_if_any(const std::string& path);
+
 /// Opens the directory at `path` beneath the open `directory`, through no symbolic link. Nothing if
 /// there is none; a link counts as none.
 [[nodiscard]] std::optional<fs::descriptor> open_directory(int directory, const std::string& path,
@@ -42,6 +48,9 @@ void copy(const fs::descriptor& source, const fs::descriptor& copy, const std::s
 /// Whether `zoneinfo` has a compiled zone file, other than in posix/ and right/: there no program
 /// looks for a zone.
 [[nodiscard]] bool holds_zones(const fs::descriptor& zoneinfo, const std::string& shown);
+
+/// The same of the directory at the path; false if the path leads nowhere.
+[[nodiscard]] bool holds_zones(const std::string& zoneinfo);
 
 /// Calls `act` with the path of every entry that is not a directory, likewise outside of posix/ and
 /// right/.

@@ -46,15 +46,6 @@ std::string path_of(const std::string& version) {
     return layout::updates_directory + version;
 }
 
-std::optional<fs::descriptor> open_directory() {
-    fs::descriptor directory(::open(layout::updates_directory, O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-    if (!directory.is_open() && is_missing()) {
-        return std::nullopt;
-    }
-    check(directory.number(), in_image(layout::updates_directory));
-    return directory;
-}
-
 std::vector<std::string> installed(const fs::descriptor& directory) {
     std::vector<std::string> versions;
     const std::string shown = in_image(layout::updates_directory);

@@ -15,9 +15,6 @@ namespace tz::updates {
 /// The path of the update of this version.
 [[nodiscard]] std::string path_of(const std::string& version);
 
-/// The directory of updates; nothing if there is none.
-[[nodiscard]] std::optional<fs::descriptor> open_directory();
-
 /// The versions of the installed updates, in the order of their names.
 [[nodiscard]] std::vector<std::string> installed(const fs::descriptor& directory);
 

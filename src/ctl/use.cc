@@ -2,8 +2,6 @@
 #include <iostream>
 #include <optional>
 
-#include <fcntl.h>
-
 #include "ctl/failure.h"
 #include "ctl/root.h"
 #include "ctl/survey.h"
@@ -13,26 +11,21 @@
 #include "ctl/verbs.h"
 #include "ctl/work.h"
 #include "fs/layout.h"
-#include "rehearsal/imagination.h"
 
 namespace tz {
 namespace {
 
 // The path of a dataset that is there, and has zones.
 std::string checked_path(const std::string& version, const work& work) {
-    constexpr int flags = O_RDONLY | O_DIRECTORY | O_CLOEXEC;
     const bool system = version == "system";
+    std::string path = system ? "" : updates::path_of(version);
     if (!system &&
         (version.empty() || version[0] == '.' || version.find('/') != std::string::npos ||
-         !fs::descriptor(::openat(work.updates().number(), version.c_str(), flags | O_NOFOLLOW))
-              .is_open())) {
+         !tree::open_directory(work.updates().number(), version, in_image(path)))) {
         refuse(version, "not installed");
     }
-    std::string path = system ? "" : updates::path_of(version);
     const std::string zoneinfo = system ? layout::system_zoneinfo : path + layout::update_zoneinfo;
-    const fs::descriptor zones(::open(zoneinfo.c_str(), flags));
-    check(zones.is_open() || is_missing() ? 0 : -1, in_image(zoneinfo));
-    if (!zones.is_open() || !tree::holds_zones(zones, in_image(zoneinfo))) {
+    if (!tree::holds_zones(zoneinfo)) {
         refuse(in_image(zoneinfo), "holds no zone file, so every time zone would be UTC");
     }
     return path;
@@ -50,20 +43,6 @@ std::vector<wanted_link> links_to(const std::string& path) {
             {layout::icu_link, path + layout::update_icu},
             {layout::legacy_icu_link, std::nullopt},
             {layout::latest_link, path}};
-}
-
-struct foresight {
-    candidates considered;
-    prediction start;
-};
-
-foresight foresee(const std::vector<wanted_link>& wanted) {
-    imagination::session imagined(in_image(""));
-    for (const auto& link : wanted) {
-        imagine(link);
-    }
-    candidates considered = look_at_candidates();
-    return {std::move(considered), predict_start(imagined)};
 }
 
 foresight make_current(const std::string& version, const work& work) {

@@ -1,11 +1,6 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #include "ctl/work.h"
 
-#include <algorithm>
-#include <array>
-#include <climits>
-#include <functional>
-
 #include <fcntl.h>
 #include <sys/file.h>
 #include <sys/stat.h>
@@ -35,12 +30,6 @@ std::string parent_of(const std::string& path) {
 
 std::string name_of(const std::string& path) {
     return path.substr(path.find_last_of('/') + 1);
-}
-
-fs::descriptor open_state_directory() {
-    fs::descriptor state(::open(layout::state_directory, directory_flags));
-    check(state.number(), in_image(layout::state_directory));
-    return state;
 }
 
 fs::descriptor open_updates(const fs::descriptor& state) {
@@ -123,8 +112,7 @@ int exchange(int directory, const std::string& name, const std::string& other) {
 // A link, and the name under which what replaces it, and then what it was, lies beside it.
 struct replacement {
     explicit replacement(const wanted_link& link)
-        : path(link.path), directory(::open(parent_of(path).c_str(), directory_flags)) {
-        check(directory.number(), in_image(parent_of(path)));
+        : path(link.path), directory(tree::open(parent_of(path))) {
         if (link.target) {
             check(::symlinkat(link.target->c_str(), directory.number(), beside.c_str()),
                   in_image(path));
@@ -155,22 +143,20 @@ void imagine(const wanted_link& wanted) {
 }
 
 std::optional<std::string> unfinished_use() {
-    const fs::descriptor state(::open(layout::state_directory, directory_flags));
     std::optional<std::string> version;
-    if (!state.is_open() && is_missing()) {
-        return version;
+    if (const auto state = tree::open_if_any(layout::state_directory)) {
+        tree::for_each_name(*state, in_image(layout::state_directory), [&](const auto& name) {
+            if (name.starts_with(unfinished)) {
+                version = updates::target_of(layout::state_directory + name);
+            }
+        });
     }
-    const std::string shown = in_image(layout::state_directory);
-    check(state.number(), shown);
-    tree::for_each_name(state, shown, [&](const std::string& name) {
-        if (name.starts_with(unfinished)) {
-            version = updates::target_of(layout::state_directory + name);
-        }
-    });
     return version;
 }
 
-work::work() : state_(open_state_directory()), updates_(open_updates(state_)), lock_(lock(state_)) {
+work::work()
+    : state_(tree::open(layout::state_directory)), updates_(open_updates(state_)),
+      lock_(lock(state_)) {
     interruption::defer();
     remove_half_made();
 }
@@ -232,7 +218,7 @@ void work::forget_unfinished_use() const try {
 }
 
 void work::remove_half_made() const {
-    const fs::descriptor above(::open(parent_of(layout::legacy_icu_link).c_str(), directory_flags));
+    const auto above = tree::open(parent_of(layout::legacy_icu_link));
     for (const auto* directory : {&state_, &updates_, &above}) {
         const int in = directory->number();
         tree::for_each_name(*directory, in_image(layout::state_directory), [&](const auto& name) {
