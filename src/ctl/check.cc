@@ -30,8 +30,8 @@ service_state state_of(const survey& found) {
     if (!found.findings.empty()) {
         return {fails ? 2 : 1, first_of(found.findings)};
     }
-    if (fails || !stays) {
-        return {fails ? 2 : 1, "the next start " + headline(next)};
+    if (!stays) {
+        return {1, "the next start " + headline(next)};
     }
     const std::string current = found.linked.current ? found.linked.current->path : "";
     return {0, dataset_name(current) + " is current" +

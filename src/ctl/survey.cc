@@ -123,7 +123,7 @@ reader describe_reader(const char* path) {
     return {describe_link(path), leads_through_current_link(path)};
 }
 
-// What is wrong with the data.
+// What is wrong with the data, the worst first.
 void add_problems_of_data(const survey& found, std::vector<std::string>& all) {
     const auto add = [&](bool holds, const std::string& problem) {
         all.insert(all.end(), holds ? 1 : 0, problem);
@@ -132,17 +132,18 @@ void add_problems_of_data(const survey& found, std::vector<std::string>& all) {
     add(!updates::exists(layout::state_directory),
         std::string(layout::state_directory) +
             " is missing: systemd-tmpfiles or the builder of the system creates it.");
-    for (const auto& data : found.installed) {
-        add(!data.readable, why_unreadable(data));
-    }
-    add(!found.linked.system, "No start can use the system's own data.");
-    add(!tree::holds_zones(layout::system_zoneinfo),
-        std::string("There is no zone file in ") + layout::system_zoneinfo + ".");
     add(!found.current_has_zones,
         "The current link leads to no zone file: programs that follow it show UTC for every zone.");
+    add(!found.linked.system, "No start can use the system's own data.");
+    add(next.decided == decision::fail, "The next start fails.");
+    add(!tree::holds_zones(layout::system_zoneinfo),
+        std::string("There is no zone file in ") + layout::system_zoneinfo + ".");
     add(next.current == verdict::not_newer,
         "The current update is older than the system's own data: \"tzctl use system\" makes that "
         "current at once.");
+    for (const auto& data : found.installed) {
+        add(!data.readable, why_unreadable(data));
+    }
 }
 
 // What is wrong with the links, and with what they lead to.
