@@ -186,6 +186,7 @@ status, in order||in_order|0|fits
 - of what is not in use||ctl|0|yes        no    may be removed
 - printed to nowhere||ctl status >/dev/full|1|standard output
 - at the end, local time||ctl|0|Local time, Europe/Paris, 
+- and that it cannot be compared|link nowhere zoneinfo|ctl|0|Local time cannot be compared: root/var/db/timezone/zo
 - local time by a link of its own|mkdir root/etc; ln -s /usr/share/zoneinfo.default/UTC root/etc/localtime|ctl|0|
     Local time, UTC, does not change: it is not
 - what a start writes|link nowhere zoneinfo|told .next_start.warnings[0]|0|Bad zoneinfo link nowhere
@@ -218,7 +219,7 @@ status, in order||in_order|0|fits
     told .installed[0].release|0|null
 - a release without end|printf %09999d 0 >$s/tz/2016g/zoneinfo/+VERSION|
     told '.installed[0].release[5000:] == ""'|0|true
-- no current link that makes sense|link nowhere zoneinfo|told .findings[]|0|Bad zoneinfo link
+- no current link that makes sense|link nowhere zoneinfo|told '[.findings[][:8]]'|0|"The loca","Bad zone"]
 - a current link by too long a name|link $(printf %0300d 0) zoneinfo|ctl check|2|TZDATA CRITICAL
 - a latest link to nowhere|link nowhere tz_latest|told .findings[]|0|The latest link leads nowhere.
 - an ICU link left behind|ctl use system; ln -s x $s/icutz|told .findings[]|0|The ICU link is left

@@ -92,7 +92,7 @@ zone_directory open_operand(operand& wanted, const candidates& linked) {
 
 comparison compare(const zone_directory& from, const zone_directory& to) {
     const std::time_t now = std::time(nullptr);
-    comparison done{from.name, to.name, now, now + ten_years, local_zone(), {}, true, {}};
+    comparison done{from.name, to.name, now, now + ten_years, local_zone(), {}, true, {}, {}};
     leave_root();
     done.found = compare_visibly(from, to, done.start, done.end);
     return done;
@@ -138,16 +138,20 @@ comparison compare(std::vector<operand> operands) {
     return compare(from, open_operand(operands.back(), linked));
 }
 
-std::optional<comparison> effect_of_next_start() try {
-    return compare_with_next(foresee({}));
-} catch (const std::system_error& error) {
-    if (error.code() == std::errc::no_such_file_or_directory ||
-        error.code() == std::errc::function_not_supported) { // before Linux 5.6
-        return std::nullopt;
+comparison effect_of_next_start() {
+    comparison none;
+    try {
+        return compare_with_next(foresee({}));
+    } catch (const std::system_error& error) {
+        if (error.code() != std::errc::no_such_file_or_directory &&
+            error.code() != std::errc::function_not_supported) { // before Linux 5.6
+            throw;
+        }
+        none.obstacle = error.what();
+    } catch (const std::exception& error) {
+        none.obstacle = error.what();
     }
-    throw;
-} catch (const std::exception&) {
-    return std::nullopt;
+    return none;
 }
 
 } // namespace tz

@@ -31,6 +31,7 @@ struct comparison {
     std::optional<std::string> next_local_zone; // if the next start replaces the local-time link
     bool local_time_follows = true;             // the data that is compared
     zone_differences found;
+    std::string obstacle; // why nothing could be compared
 };
 
 /// Compares two datasets from now on, for ten years: the current one and what the next start makes
@@ -38,8 +39,8 @@ struct comparison {
 /// needs the machine's "/proc". Throws std::exception.
 [[nodiscard]] comparison compare(std::vector<operand> operands);
 
-/// What the next start changes for clocks. Nothing if something for that is missing or refused.
-/// Throws other failures. Leaves the image, too.
-[[nodiscard]] std::optional<comparison> effect_of_next_start();
+/// What the next start changes for clocks; with an obstacle if something for that is missing or
+/// refused. Throws other failures. Leaves the image, too.
+[[nodiscard]] comparison effect_of_next_start();
 
 } // namespace tz

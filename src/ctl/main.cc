@@ -146,10 +146,8 @@ void print_status() {
     const auto found = tz::look();
     const auto effect = tz::effect_of_next_start();
     tz::print_for_people(found);
-    if (effect) {
-        std::cout << '\n';
-        tz::print_effect(*effect);
-    }
+    std::cout << '\n';
+    tz::print_effect(effect);
 }
 
 // The exit status.
@@ -164,9 +162,7 @@ int run(const CLI::App& app, const command_line& given) {
     if (app.got_subcommand("install")) {
         install(given);
         try {
-            if (const auto effect = tz::effect_of_next_start()) {
-                tz::print_effect(*effect);
-            }
+            tz::print_effect(tz::effect_of_next_start());
         } catch (const std::exception& error) { // it is installed all the same
             std::cerr << "tzctl: " << tz::printable(error.what()) << '\n';
         }

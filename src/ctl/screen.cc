@@ -205,6 +205,10 @@ void print_for_people(const comparison& done) {
 }
 
 void print_effect(const comparison& done) {
+    if (!done.obstacle.empty()) {
+        std::cout << wrapped("Local time cannot be compared: " + done.obstacle + ".");
+        return;
+    }
     const auto others =
         std::count_if(done.found.changed.begin(), done.found.changed.end(),
                       [&](const zone_change& change) { return change.zone != done.local_zone; });

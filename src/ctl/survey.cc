@@ -199,6 +199,17 @@ candidates look_at_candidates() {
             latest && !latest->empty() ? describe(*latest, system) : std::nullopt};
 }
 
+// Of the same finding, also of a warning that a second look prints with the error of another call.
+void drop_repetitions(std::vector<std::string>& findings) {
+    const std::set<std::string> all(findings.begin(), findings.end());
+    std::set<std::string> known;
+    std::erase_if(findings, [&](const std::string& finding) {
+        const auto error = finding.rfind(": ");
+        return !known.insert(finding).second ||
+               (error != std::string::npos && all.contains(finding.substr(0, error)));
+    });
+}
+
 } // namespace
 
 // Unlike a start's own way to the word, this one leads out of no dataset, since the word is
@@ -244,9 +255,7 @@ survey look() {
     add_problems_of_data(found, found.findings);
     add_problems_of_links(found, found.findings);
     found.findings.insert(found.findings.end(), warnings.begin(), warnings.end());
-    std::set<std::string> known;
-    std::erase_if(found.findings,
-                  [&](const std::string& finding) { return !known.insert(finding).second; });
+    drop_repetitions(found.findings);
     return found;
 }
 
