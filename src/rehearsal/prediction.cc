@@ -28,7 +28,6 @@ prediction predict_start(imagination::session& imagined) {
     }
     imagined.check();
     const auto after = links(imagined);
-    start.zoneinfo = after[0];
     start.icutz = after[1];
     start.localtime = after[2];
     start.changes = before != after;

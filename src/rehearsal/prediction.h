@@ -13,10 +13,9 @@ namespace tz {
 /// What one start would do.
 struct prediction {
     outcome result;
-    std::optional<std::string> zoneinfo; // targets of the links afterwards, if there are such
-    std::optional<std::string> icutz;
+    std::optional<std::string> icutz; // targets of the links afterwards, if there are such
     std::optional<std::string> localtime;
-    bool changes = false;        // whether any of these differs from now
+    bool changes = false;        // whether one of these, or the current link, then differs from now
     bool has_local_time = false; // whether the local-time link then leads to something
     std::vector<std::string> warnings;
 };
