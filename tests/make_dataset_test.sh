@@ -74,7 +74,7 @@ make system 2147483648b one out/share|2147483648b: contains a number greater tha
 make system table/tzdata.zi one out/share|table/zone.tab: not a readable file
 make update deb one out/2016b.1.99999999999999999999|.99999999999999999999: contains a number greater
 make update deb one out/2016b.1.|2016b.1.: not a version such as 2016a.1.0
-make update deb one out/2016bb.1|2016bb.1: not a version of release 2016b, such as 2016b.1.0
+make update deb one out/2016bb.1|2016bb.1: not a version of release 2016b, such as 2016b.1.1
 make update deb one out/2016b.9/|out/2016b.9/: already exists
 make system deb nowhere out/share|nowhere: not a readable file
 make system deb none out/share|none: contains no ICU data file

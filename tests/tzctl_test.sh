@@ -90,6 +90,8 @@ install||ctl install 2016h|0|adopts update 2016h|d d h b d e f g h
 - another schema|mv 2016h/icutz/icutz44{l,b}.dat|ctl install 2016h|1|2016h has ICU schema 44b, the system
 - no zones|rm -r 2016h/zoneinfo|ctl install 2016h|1|holds no zone
 - no zones, by force|rm -r 2016h/zoneinfo|ctl install --force 2016h|0|holds no zone|d d h b d e f g h
+- with two objections, by force|rm -r 2016h/zoneinfo/Europe; echo 2016g >2016h/zoneinfo/+VERSION|
+    ctl install --force 2016h|0|its data is of release 2016g.|d d h b d e f g h
 - zones in posix and right only|mv 2016h/zoneinfo new; mkdir 2016h/zoneinfo; cp -r new 2016h/zoneinfo/right;
     mv new 2016h/zoneinfo/posix|ctl install 2016h|1|holds no zone
 - no version as a name|mv 2016h 2016H|ctl install 2016H|1|2016H: its name is not a version
@@ -246,6 +248,7 @@ status, in order||in_order|0|fits
     told .findings|0|leads to no compiled zone file."
 - what programs read|mkdir root/etc; ln -s /var/db/timezone/localtime root/etc|
     told '[.readers[].follows]'|0|[false,true]
+- a link in the place of the updates|mv $s/tz root/; ln -s /tz $s/tz|told .findings[0]|0|tz is a symbolic link
 - no state directory|rm -r $s|told .findings[0]|0|systemd-tmpfiles or the builder
 - older than the system's own data|link @b/zoneinfo zoneinfo|
     told .findings[]|0|"tzctl use system" makes that current
@@ -257,8 +260,10 @@ check||ctl check|0|TZDATA OK - update 2016d is current, the next start adopts up
 - old data|link @b/zoneinfo zoneinfo; link @b/icutz icutz|ctl check|1|TZDATA WARNING - The current update is older
 - a start that fails|rm $s/{icutz,localtime}; mkdir -p $s/localtime/x|ctl check|2|TZDATA CRITICAL - The next start fails (and
 - printed to nowhere||ctl check >&-|3|standard output
+- no zones in what comes next|rm -r $s/tz/2016f/zoneinfo|ctl check|1|will show UTC
 - no zones|rm -r $s/tz/2016d/zoneinfo|ctl check|2|TZDATA CRITICAL - The current link leads to no zone file
 - what cannot be read||disturbed openat:error=EMFILE:when=40+ check|3|TZDATA UNKNOWN - 
+- an empty word for the image||ctl check --root=|3|TZDATA UNKNOWN - --root
 - no image||"$tzctl" --root nowhere check|3|TZDATA UNKNOWN - nowhere: No such file
 - wrong usage||ctl check --verbose|3|TZDATA UNKNOWN - 
 --help||ctl --help|0|Delete updates

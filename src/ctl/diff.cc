@@ -69,7 +69,7 @@ zone_directory open_zones_of(const std::string& path, const candidates& linked) 
 zone_directory open_linked(const std::optional<dataset>& named, const char* link,
                            const candidates& linked) {
     if (!named) {
-        refuse(in_image(link), "names no dataset");
+        refuse(in_image(link), "missing, or names no dataset");
     }
     return open_zones_of(named->path, linked);
 }
@@ -84,10 +84,11 @@ zone_directory open_operand(operand& wanted, const candidates& linked) {
     if (wanted.text == "latest") {
         return open_linked(linked.latest, layout::latest_link, linked);
     }
-    if (wanted.text != "system" && !split_version(wanted.text)) {
-        refuse(wanted.text, "not a version such as 2016b.1.0");
+    const std::string path = wanted.text == "system" ? "" : updates::path_of(wanted.text);
+    if (!path.empty() && !(split_version(wanted.text) && updates::exists(path))) {
+        refuse(wanted.text, "not an installed version (a directory must contain a slash)");
     }
-    return open_zones_of(wanted.text == "system" ? "" : updates::path_of(wanted.text), linked);
+    return open_zones_of(path, linked);
 }
 
 comparison compare(const zone_directory& from, const zone_directory& to) {

@@ -20,11 +20,7 @@
 namespace tz {
 namespace {
 
-void check_name(const std::string& version, const std::string& shown, bool forced) {
-    if (version.empty() || version[0] == '.' || !(forced || split_version(version))) {
-        refuse(shown, "its name is not a version such as 2016b.1.0");
-    }
-}
+constexpr char no_version[] = "its name is not a version such as 2016b.1.0";
 
 // A copy of the dataset, in which nobody else can change anything.
 fs::descriptor stage(const fs::descriptor& source, const std::string& shown, const work& work,
@@ -66,27 +62,28 @@ bool is_older(const std::string& release, const std::string& than) {
            data_version(than) > data_version(release);
 }
 
-// Why the dataset should not be installed; empty if it may be.
-std::string objection(const foresight& next, const std::string& version,
-                      const fs::descriptor& staged, const std::string& shown) {
+// Why the dataset should not be installed.
+std::vector<std::string> objections(const foresight& next, const std::string& version,
+                                    const fs::descriptor& staged, const std::string& shown) {
+    std::vector<std::string> all;
+    const auto add = [&](bool holds, const std::string& why) {
+        all.insert(all.end(), holds ? 1 : 0, why);
+    };
     const outcome& result = next.start.result;
-    if ((result.decided != decision::adopt && result.decided != decision::keep) ||
-        result.dataset != updates::path_of(version)) {
-        return "the next start would not adopt it: " + reason(result, next.considered);
-    }
-    if (!has_zones(staged, shown)) {
-        return "it holds no zone file, so every time zone would be UTC";
-    }
+    const bool stays = result.decided == decision::adopt || result.decided == decision::keep;
     const std::string release = release_in(staged, layout::update_zoneinfo);
-    if (!release.empty() && version != release && !version.starts_with(release + ".")) {
-        return "its data is of release " + release;
-    }
     const std::string icu_release = release_in(staged, layout::update_icu);
     const std::string current =
         next.considered.current ? next.considered.current->icu_release : std::string();
-    return is_older(icu_release, current) ? "its ICU data is of release " + icu_release +
-                                                ", which is older than the current " + current
-                                          : "";
+    add(!split_version(version), no_version);
+    add(!stays || result.dataset != updates::path_of(version),
+        "the next start would not adopt it: " + reason(result, next.considered));
+    add(!has_zones(staged, shown), "it holds no zone file, so every time zone would be UTC");
+    add(!release.empty() && version != release && !version.starts_with(release + "."),
+        "its data is of release " + release);
+    add(is_older(icu_release, current), "its ICU data is of release " + icu_release +
+                                            ", which is older than the current " + current);
+    return all;
 }
 
 void publish(const std::string& version, const std::string& staged, const work& work) {
@@ -106,7 +103,9 @@ void publish(const std::string& version, const std::string& staged, const work& 
 
 void install(const fs::descriptor& source, const std::string& shown, const std::string& version,
              bool forced) {
-    check_name(version, shown, forced);
+    if (version.empty() || version[0] == '.') {
+        refuse(shown, no_version);
+    }
     const work work;
     finish_interrupted_use(work);
     const std::string staged_name = tree::temporary_name();
@@ -119,9 +118,9 @@ void install(const fs::descriptor& source, const std::string& shown, const std::
         wanted.push_back({place, updates::path_of(staged_name)});
     }
     const auto next = foresee(wanted);
-    const std::string against = objection(next, version, staged, shown);
+    const auto against = objections(next, version, staged, shown);
     if (!against.empty() && !forced) {
-        refuse(shown, against);
+        refuse(shown, against.front());
     }
     interruption::check();
     if (installed) {
@@ -132,8 +131,10 @@ void install(const fs::descriptor& source, const std::string& shown, const std::
     std::cout << wrapped(installed ? "Update " + version + " is installed already."
                                    : "Installed update " + version + ".")
               << wrapped("The next start " + headline(next.start.result) + ".")
-              << wrapped(against.empty() ? reason(next.start.result, next.considered)
-                                         : "Forced, although " + against);
+              << (against.empty() ? wrapped(reason(next.start.result, next.considered)) : "");
+    for (const auto& why : against) {
+        std::cout << wrapped("Forced, although " + why + (why.ends_with('.') ? "" : "."));
+    }
 }
 
 } // namespace tz

@@ -5,7 +5,6 @@
 #include <filesystem>
 #include <iostream>
 #include <string>
-#include <string_view>
 #include <system_error>
 #include <vector>
 
@@ -90,7 +89,8 @@ void declare(CLI::App& app, command_line& given) {
     app.require_subcommand(0, 1);
     app.fallthrough();
 
-    app.add_subcommand("status", "Show what is current and what the next start does (default)");
+    auto* const status =
+        app.add_subcommand("status", "Show what is current and what the next start does (default)");
     auto* const diff =
         app.add_subcommand("diff", "Show which clocks the next start, or a dataset, changes");
     for (const char* name : {"FROM", "TO"}) {
@@ -99,11 +99,14 @@ void declare(CLI::App& app, command_line& given) {
                 "A version, system, current, latest, or a directory with a slash")
             ->check(not_empty);
     }
+    for (auto* const verb : {status, diff}) {
+        verb->add_flag("--json", given.json, "Print a JSON object, for programs");
+    }
     auto* const install = app.add_subcommand("install", "Install an update for the next start");
     install->add_option("DATASET", given.dataset, "Directory that tzctl make has made")
         ->required()
         ->check(not_empty);
-    install->add_flag("--force", given.forced, "Install it despite objections, and print these");
+    install->add_flag("--force", given.forced, "Install it despite objections, and print them");
     app.add_subcommand("check", "Print one line for a monitoring system");
     app.add_subcommand("use", "Make an installed update current now, and keep it")
         ->add_option("VERSION", given.version, "Its version; \"system\" for the system's own data")
@@ -197,15 +200,25 @@ int refuse_usage(const CLI::App& app, const CLI::ParseError& error) {
     return 2;
 }
 
+// The words as CLI11 takes them, which would take the word after "--root=" for the directory.
+std::vector<std::string> last_first(int count, char** words) {
+    std::vector<std::string> all;
+    for (int at = count - 1; at > 0; --at) {
+        all.emplace_back(words[at]);
+        if (all.back() == "--root=") {
+            all.back() = "";
+            all.emplace_back("--root");
+        }
+    }
+    return all;
+}
+
 int parse_and_run(int count, char** words) {
     CLI::App app("Shows which time-zone data is current and why, and manages updates.", "tzctl");
     command_line given;
     declare(app, given);
     try {
-        if (std::count(words, words + count, std::string_view("--root=")) != 0) {
-            throw CLI::ValidationError("--root", "an empty text"); // not the next word
-        }
-        app.parse(count, words);
+        app.parse(last_first(count, words));
         return run(app, given);
     } catch (const CLI::ParseError& error) {
         return refuse_usage(app, error);

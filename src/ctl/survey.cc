@@ -153,7 +153,11 @@ void add_problems_of_links(const survey& found, std::vector<std::string>& all) {
     };
     const auto& current = found.linked.current;
     const bool update = current && !current->path.empty();
+    std::string updates = layout::updates_directory;
+    updates.pop_back(); // or a link would be followed
     const prediction& next = found.next_start;
+    add(updates::target_of(updates).has_value(),
+        updates + " is a symbolic link: tzctl changes nothing then.");
     add(update && found.icutz.target != current->path + layout::update_icu,
         "The ICU link does not lead into the current update: \"tzctl use\" corrects that.");
     add(current && !update && found.icutz.state != link_state::missing,
@@ -173,6 +177,10 @@ void add_problems_of_links(const survey& found, std::vector<std::string>& all) {
         "The local-time link is " +
             std::string(found.localtime.state == link_state::missing ? "missing" : "invalid") +
             ": the next start makes it lead to " + next.localtime.value_or("") + ".");
+    add(!next.result.dataset.empty() &&
+            !tree::holds_zones(next.result.dataset + layout::update_zoneinfo),
+        "The next start makes data current that contains no zone file: programs that follow the "
+        "current link will show UTC for every zone.");
     add(found.localtime.state == link_state::ok && !next.has_local_time,
         "The next start makes data current that lacks the local zone.");
     if (const auto version = unfinished_use()) {
