@@ -41,7 +41,8 @@ void adopt(const kiv_dataset& latest, const kiv_dataset& effective, const kiv_da
     write_version_diff_record(effective, latest);
 }
 
-// Each verdict is `failed` until it is known, as it then stays if an exception ends the sequence.
+// An exception ends the sequence and leaves `so_far` as it is then. So each verdict is `failed`
+// while the steps that determine it run.
 void reconcile(outcome& so_far) {
     const kiv_dataset system;
     so_far.latest = verdict::failed;
