@@ -48,7 +48,7 @@ zone_directory open_zones(const std::string& name, const std::string& path) {
 }
 
 zone_directory open_zones_in(const std::string& directory) {
-    const std::string base = tree::own_name(directory);
+    const std::string base = tree::own_name(tree::open(directory), directory);
     const std::string& name = base.empty() ? directory : base;
     for (const char* inside : {"zoneinfo.default", "zoneinfo"}) {
         const std::string zones = std::filesystem::path(directory) / inside;

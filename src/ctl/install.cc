@@ -22,12 +22,12 @@ namespace {
 
 constexpr char no_version[] = "its name is not a version such as 2016b.1.0";
 
-// A copy of the dataset, in which nobody else can change anything.
+// A copy of the dataset, in which nobody else can change or read anything.
 fs::descriptor stage(const fs::descriptor& source, const std::string& shown, const work& work,
                      const std::string& name) {
     (void)::umask(022);
     const std::string path = in_image(updates::path_of(name));
-    check(::mkdirat(work.updates().number(), name.c_str(), 0755), path);
+    check(::mkdirat(work.updates().number(), name.c_str(), 0700), path);
     auto staged = tree::open_directory(work.updates().number(), name, path);
     struct stat status {};
     if (!staged || ::fstat(staged->number(), &status) == -1 || status.st_uid != ::geteuid()) {
@@ -45,7 +45,7 @@ bool is_installed(const std::string& version, const fs::descriptor& staged, cons
         return false;
     }
     const auto installed = tree::open_directory(work.updates().number(), version, path);
-    if (!installed || !tree::equal(staged, *installed, path)) {
+    if (!installed || !tree::equal(*installed, staged, path)) {
         refuse(path, "installed already, with other contents");
     }
     return true;
@@ -86,15 +86,20 @@ std::vector<std::string> objections(const foresight& next, const std::string& ve
     return all;
 }
 
-void publish(const std::string& version, const std::string& staged, const work& work) {
+void publish(const std::string& version, const fs::descriptor& staged,
+             const std::string& staged_name, const work& work) {
     const std::string place = updates::path_of(version);
     const int updates = work.updates().number();
-    check(kernel::rename_to_free_name(updates, staged, version), in_image(place));
+    check(::fchmod(staged.number(), 0755), in_image(place));
+    check(::fsync(staged.number()), in_image(place));
+    check(kernel::rename_to_free_name(updates, staged_name, version), in_image(place));
     try {
         check(::fsync(updates), in_image(layout::updates_directory));
         work.replace({{layout::latest_link, place}});
     } catch (...) {
-        (void)kernel::rename_to_free_name(updates, version, staged);
+        if (updates::target_of(layout::latest_link) != place) { // or the link would lead nowhere
+            (void)kernel::rename_to_free_name(updates, version, staged_name);
+        }
         throw;
     }
 }
@@ -126,7 +131,7 @@ void install(const fs::descriptor& source, const std::string& shown, const std::
     if (installed) {
         work.replace({{layout::latest_link, place}});
     } else {
-        publish(version, staged_name, work);
+        publish(version, staged, staged_name, work);
     }
     std::cout << wrapped(installed ? "Update " + version + " is installed already."
                                    : "Installed update " + version + ".")

@@ -65,7 +65,7 @@ void enter_root_if_any(const std::string& root) {
 // The dataset's path is the caller's, so it is opened before the image is entered.
 void install(const command_line& given) {
     const auto dataset = tz::tree::open(given.dataset);
-    const std::string version = tz::tree::own_name(given.dataset);
+    const std::string version = tz::tree::own_name(dataset, given.dataset);
     enter_root_if_any(given.root);
     tz::install(dataset, given.dataset, version, given.forced);
 }

@@ -182,9 +182,9 @@ bool have_same_contents(const fs::descriptor& one, const fs::descriptor& other,
     }
 }
 
-bool is_equal(const item& entry, const fs::descriptor& other, const std::string& shown) {
+bool is_equal(const item& entry, const fs::descriptor& own, const std::string& shown) {
     struct stat status {};
-    if (::fstatat(other.number(), entry.path.c_str(), &status, AT_SYMLINK_NOFOLLOW) == -1) {
+    if (::fstatat(own.number(), entry.path.c_str(), &status, AT_SYMLINK_NOFOLLOW) == -1) {
         check(is_missing() ? 0 : -1, shown);
         return false;
     }
@@ -193,24 +193,16 @@ bool is_equal(const item& entry, const fs::descriptor& other, const std::string&
     }
     if (S_ISLNK(status.st_mode)) {
         return target_of(entry.directory, entry.name, shown) ==
-               target_of(other.number(), entry.path, shown);
+               target_of(own.number(), entry.path, shown);
     }
     if (!S_ISREG(status.st_mode)) {
         return S_ISDIR(status.st_mode);
     }
-    const fs::descriptor mine = open_regular_file(entry.directory, entry.name);
-    check(mine.number(), shown);
-    const fs::descriptor theirs = open_regular_file(other.number(), entry.path);
+    const fs::descriptor theirs = open_regular_file(entry.directory, entry.name);
     check(theirs.number(), shown);
-    return have_same_contents(mine, theirs, shown);
-}
-
-bool has_everything_of(const fs::descriptor& one, const fs::descriptor& other,
-                       const std::string& shown) {
-    return !walk(one, shown, [&](const item& entry) {
-        interruption::check();
-        return is_equal(entry, other, shown + "/" + entry.path) ? next::descend : next::stop;
-    });
+    const fs::descriptor mine = open_regular_file(own.number(), entry.path);
+    check(mine.number(), shown);
+    return have_same_contents(theirs, mine, shown);
 }
 
 // Visits what is no directory where programs look for zones, until a visit returns true.
@@ -315,13 +307,20 @@ std::optional<fs::descriptor> open_directory(int directory, const std::string& p
     return at;
 }
 
-std::string own_name(const std::string& directory) {
+std::string own_name(const fs::descriptor& directory, const std::string& path) {
     std::error_code failure;
-    const auto path = std::filesystem::canonical(directory, failure);
+    const auto whole = std::filesystem::canonical(path, failure);
     if (failure) {
-        throw std::system_error(failure, directory);
+        throw std::system_error(failure, path);
     }
-    return path.filename();
+    struct stat opened {};
+    struct stat named {};
+    check(::fstat(directory.number(), &opened), path);
+    check(::lstat(whole.c_str(), &named), path);
+    if (!is_same(opened, named)) {
+        refuse(path, "changed while it was read");
+    }
+    return whole.filename();
 }
 
 void for_each_name(const fs::descriptor& directory, const std::string& shown,
@@ -336,7 +335,8 @@ void copy(const fs::descriptor& source, const fs::descriptor& copy, const std::s
     (void)walk(source, shown, [&](const item& entry) {
         interruption::check();
         const std::string path = shown + "/" + entry.path;
-        if (entry.status.st_uid != top.st_uid && (entry.status.st_mode & S_IROTH) == 0) {
+        const mode_t needed = S_IROTH | (S_ISDIR(entry.status.st_mode) ? S_IXOTH : 0);
+        if (entry.status.st_uid != top.st_uid && (entry.status.st_mode & needed) != needed) {
             refuse(path, "readable only by another user than the dataset's owner");
         }
         copy_item(entry, copy.number(), path);
@@ -348,8 +348,19 @@ void copy(const fs::descriptor& source, const fs::descriptor& copy, const std::s
     }
 }
 
-bool equal(const fs::descriptor& one, const fs::descriptor& other, const std::string& shown) {
-    return has_everything_of(one, other, shown) && has_everything_of(other, one, shown);
+bool equal(const fs::descriptor& theirs, const fs::descriptor& own, const std::string& shown) {
+    std::size_t in_theirs = 0;
+    std::size_t in_own = 0;
+    const bool differs = walk(theirs, shown, [&](const item& entry) {
+        interruption::check();
+        ++in_theirs;
+        return is_equal(entry, own, shown + "/" + entry.path) ? next::descend : next::stop;
+    });
+    (void)walk(own, shown, [&](const item& /*entry*/) {
+        ++in_own;
+        return next::descend;
+    });
+    return !differs && in_theirs == in_own;
 }
 
 bool is_zone(int directory, const std::string& name, const std::string& shown) {

@@ -24,8 +24,9 @@ namespace tz::tree {
 [[nodiscard]] std::optional<fs::descriptor> open_directory(int directory, const std::string& path,
                                                            const std::string& shown);
 
-/// The last element of the path of `directory` without symbolic links; empty for "/".
-[[nodiscard]] std::string own_name(const std::string& directory);
+/// The name of the open `directory`, to which `path` leads; empty for "/". Throws also if `path`
+/// leads elsewhere by now.
+[[nodiscard]] std::string own_name(const fs::descriptor& directory, const std::string& path);
 
 /// Calls `act` with the name of every entry of the open `directory`.
 void for_each_name(const fs::descriptor& directory, const std::string& shown,
@@ -39,7 +40,8 @@ void for_each_name(const fs::descriptor& directory, const std::string& shown,
 void copy(const fs::descriptor& source, const fs::descriptor& copy, const std::string& shown);
 
 /// Whether both directories hold the same, byte for byte; owners, modes and times do not count.
-[[nodiscard]] bool equal(const fs::descriptor& one, const fs::descriptor& other,
+/// Only this user may change `own`: what is in it is looked up by its path.
+[[nodiscard]] bool equal(const fs::descriptor& theirs, const fs::descriptor& own,
                          const std::string& shown);
 
 /// Whether the regular file `name` in `directory` begins as a compiled zone file.
