@@ -155,9 +155,14 @@ use||ctl use 2016f|0|Current now: update 2016f.|f f f b d e f g
 - where renaming has no flags||disturbed renameat2:error=EINVAL use 2016f|0|2016f|f f f b d e f g
 - and a link cannot be replaced|rm $s/tz_latest; touch $s/tz_latest|
     disturbed "renameat2:error=EINVAL -e inject=?rename,renameat:error=EIO:when=3" use 2016f|1|output error
+- and none can be put back|rm $s/tz_latest|
+    disturbed "renameat2:error=EINVAL -e inject=?rename,renameat:error=EIO:when=2+" use 2016f; ctl cleanup|0|2016d|
+    f f f f
 - what cannot be brought onto the disk||disturbed ?sync,syncfs,fsync:error=EIO use 2016f|1|Input/output error
 - unfinished|ln -s 2016f $s/.tzctl.use.0|told .findings[]|0|tzctl use 2016f
 - unfinished, then cleanup|ln -s 2016f $s/.tzctl.use.0; link @f/zoneinfo zoneinfo|ctl cleanup|0|2016d|f f f f
+- unfinished, and a failure again|ln -s 2016f $s/.tzctl.use.0|
+    disturbed ?rename,?renameat,renameat2:error=EIO:when=1 cleanup|1|output error|d d f b d e f g .tzctl.use.0
 - unfinished, but unfit by now|ln -s 2016e $s/.tzctl.use.0|ctl cleanup|0|2016e has ICU schema|d d f d f
 cleanup||ctl cleanup|0|Deleted update 2016g|d d f d f
 - nothing|ctl cleanup|ctl cleanup|0|no update

@@ -67,7 +67,9 @@ void finish_interrupted_use(const work& work) {
     }
     try {
         (void)make_current(*version, work);
-    } catch (const std::exception& error) {
+    } catch (const std::system_error&) {
+        throw; // the next one tries again
+    } catch (const std::runtime_error& error) {
         std::cerr << "tzctl: cannot complete \"use " << printable(*version)
                   << "\": " << printable(error.what()) << '\n';
     }
@@ -76,7 +78,11 @@ void finish_interrupted_use(const work& work) {
 
 void use(const std::string& version) {
     const work work;
-    finish_interrupted_use(work);
+    try {
+        finish_interrupted_use(work);
+    } catch (const std::system_error&) {
+        // This sets the same links.
+    }
     const auto next = make_current(version, work);
     const outcome& result = next.start.result;
     std::cout << wrapped("Current now: " + dataset_name(result.dataset) + ".")

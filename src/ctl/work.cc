@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #include "ctl/work.h"
 
+#include <algorithm>
+
 #include <fcntl.h>
 #include <sys/file.h>
 #include <sys/stat.h>
@@ -69,11 +71,6 @@ fs::descriptor lock(const fs::descriptor& state) {
     return file;
 }
 
-bool is_link(int directory, const std::string& name) {
-    char none = 0;
-    return ::readlinkat(directory, name.c_str(), &none, 1) != -1;
-}
-
 // For file systems that cannot do it in one step. There always is an entry of the first name.
 int exchange_in_steps(int directory, const std::string& name, const std::string& other) {
     const auto rename = [&](const std::string& from, const std::string& to) {
@@ -123,7 +120,10 @@ struct replacement {
         return tz::exchange(directory.number(), name_of(path), beside);
     }
 
+    [[nodiscard]] bool is_undone() const { return updates::target_of(path) == former; }
+
     std::string path;
+    std::optional<std::string> former = updates::target_of(path);
     fs::descriptor directory;
     std::string beside = tree::temporary_name();
 };
@@ -146,9 +146,10 @@ std::optional<std::string> unfinished_use() {
     std::optional<std::string> version;
     if (const auto state = tree::open_if_any(layout::state_directory)) {
         tree::for_each_name(*state, in_image(layout::state_directory), [&](const auto& name) {
-            if (name.starts_with(unfinished)) {
-                version = updates::target_of(layout::state_directory + name);
-            }
+            const bool is_note = name.starts_with(unfinished);
+            auto noted =
+                is_note ? updates::target_of(layout::state_directory + name) : std::nullopt;
+            version = noted ? std::move(noted) : version;
         });
     }
     return version;
@@ -176,10 +177,11 @@ void work::replace(const std::vector<wanted_link>& wanted, const std::string& ve
             all.emplace_back(link);
         }
     }
+    const std::string note = tree::temporary_name(unfinished);
     auto next = all.begin();
     try {
         if (!version.empty()) {
-            note_unfinished_use(version);
+            note_unfinished_use(version, note);
         }
         for (; next != all.end(); ++next) {
             check(next->exchange(), in_image(next->path));
@@ -188,21 +190,19 @@ void work::replace(const std::vector<wanted_link>& wanted, const std::string& ve
             check(::fsync(link.directory.number()), in_image(parent_of(link.path)));
         }
     } catch (...) {
-        bool undone = true;
         while (next != all.begin()) {
-            undone = (--next)->exchange() == 0 && undone;
+            (void)(--next)->exchange();
         }
-        if (undone) {
-            forget_unfinished_use();
+        if (std::all_of(all.begin(), all.end(), [](const auto& one) { return one.is_undone(); })) {
+            (void)::unlinkat(state_.number(), note.c_str(), 0);
         }
         throw;
     }
     forget_unfinished_use();
 }
 
-void work::note_unfinished_use(const std::string& version) const {
-    const std::string name = tree::temporary_name(unfinished);
-    check(::symlinkat(version.c_str(), state_.number(), name.c_str()),
+void work::note_unfinished_use(const std::string& version, const std::string& note) const {
+    check(::symlinkat(version.c_str(), state_.number(), note.c_str()),
           in_image(layout::state_directory));
     check(::fsync(state_.number()), in_image(layout::state_directory));
 }
@@ -222,8 +222,8 @@ void work::remove_half_made() const {
     for (const auto* directory : {&state_, &updates_, &above}) {
         const int in = directory->number();
         tree::for_each_name(*directory, in_image(layout::state_directory), [&](const auto& name) {
-            const bool is_note = name.starts_with(unfinished) && is_link(in, name);
-            if ((name + ".").starts_with(tree::half_made) && name != lock_name && !is_note) {
+            const bool stays = name == lock_name || name.starts_with(unfinished);
+            if ((name + ".").starts_with(tree::half_made) && !stays) {
                 (void)tree::remove(in, name, name, [](const std::string&) {});
             }
         });

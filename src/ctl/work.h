@@ -44,7 +44,7 @@ class work {
     void forget_unfinished_use() const;
 
   private:
-    void note_unfinished_use(const std::string& version) const;
+    void note_unfinished_use(const std::string& version, const std::string& note) const;
     void remove_half_made() const;
 
     fs::descriptor state_;
