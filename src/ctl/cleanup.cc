@@ -61,7 +61,7 @@ bool delete_unused(const fs::descriptor& updates, bool rehearsed) {
             freed += size;
             std::cout << (rehearsed ? "Would delete update " : "Deleted update ") << version << ": "
                       << size / mega << " MB\n";
-        } catch (const std::system_error& error) {
+        } catch (const std::exception& error) {
             std::cerr << "tzctl: " << printable(error.what()) << '\n';
             complete = false;
         }

@@ -145,7 +145,7 @@ void print_as_json(const survey& found) {
                               {"record", text_or_null(found.record)},
                               {"next_start", described(found.next_start, found.linked)},
                               {"findings", texts(found.findings)}};
-    std::cout << object.dump(2) << '\n';
+    std::cout << object.dump(2, ' ', true) << '\n';
 }
 
 void print_as_json(const comparison& done) {
@@ -161,7 +161,7 @@ void print_as_json(const comparison& done) {
                               {"removed", texts(done.found.removed)},
                               {"unreadable_from", texts(done.found.unreadable_before)},
                               {"unreadable_to", texts(done.found.unreadable_after)}};
-    std::cout << object.dump(2) << '\n';
+    std::cout << object.dump(2, ' ', true) << '\n';
 }
 
 } // namespace tz

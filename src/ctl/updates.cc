@@ -70,8 +70,10 @@ std::vector<std::string> removable(const fs::descriptor& directory) {
     auto versions = installed(directory);
     std::erase_if(versions, [&](const std::string& version) {
         struct stat status {};
-        check(::fstatat(directory.number(), version.c_str(), &status, AT_SYMLINK_NOFOLLOW),
-              in_image(path_of(version)));
+        if (::fstatat(directory.number(), version.c_str(), &status, AT_SYMLINK_NOFOLLOW) == -1) {
+            check(is_missing() ? 0 : -1, in_image(path_of(version)));
+            return true; // deleted meanwhile
+        }
         return std::any_of(in_use.begin(), in_use.end(), [&](const way& one) {
             return one.passes({status.st_dev, status.st_ino});
         });

@@ -66,7 +66,8 @@ int open_directory_on_same_mount(int directory, const std::string& name) {
     const auto parent_status = status_of(directory, "", AT_EMPTY_PATH);
     const auto status = status_of(child.number(), "", AT_EMPTY_PATH);
     if (child.is_open() && (status.stx_dev_major != parent_status.stx_dev_major ||
-                            status.stx_dev_minor != parent_status.stx_dev_minor)) {
+                            status.stx_dev_minor != parent_status.stx_dev_minor ||
+                            (status.stx_attributes & STATX_ATTR_MOUNT_ROOT) != 0)) {
         errno = EXDEV;
         return -1;
     }
