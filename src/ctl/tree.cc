@@ -300,7 +300,7 @@ std::optional<fs::descriptor> open_directory(int directory, const std::string& p
         at = fs::descriptor(
             ::openat(at ? at->number() : directory, name.c_str(), directory_flags | O_NOFOLLOW));
         if (!at->is_open()) {
-            check(is_missing() || errno == ELOOP ? 0 : -1, shown);
+            check(is_missing() || errno == ELOOP || errno == ENAMETOOLONG ? 0 : -1, shown);
             return std::nullopt;
         }
     }

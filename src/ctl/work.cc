@@ -71,6 +71,13 @@ fs::descriptor lock(const fs::descriptor& state) {
     return file;
 }
 
+// Whether `name` is a link that notes an unfinished use, or may be one that cannot be read.
+bool may_be_note(int directory, const std::string& name) {
+    char none = 0;
+    return name.starts_with(unfinished) &&
+           (::readlinkat(directory, name.c_str(), &none, 1) != -1 || errno != EINVAL);
+}
+
 // For file systems that cannot do it in one step. There always is an entry of the first name.
 int exchange_in_steps(int directory, const std::string& name, const std::string& other) {
     const auto rename = [&](const std::string& from, const std::string& to) {
@@ -222,7 +229,7 @@ void work::remove_half_made() const {
     for (const auto* directory : {&state_, &updates_, &above}) {
         const int in = directory->number();
         tree::for_each_name(*directory, in_image(layout::state_directory), [&](const auto& name) {
-            const bool stays = name == lock_name || name.starts_with(unfinished);
+            const bool stays = directory == &state_ && (name == lock_name || may_be_note(in, name));
             if ((name + ".").starts_with(tree::half_made) && !stays) {
                 (void)tree::remove(in, name, name, [](const std::string&) {});
             }
