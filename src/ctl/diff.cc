@@ -149,7 +149,7 @@ comparison effect_of_next_start() {
             throw;
         }
         none.obstacle = error.what();
-    } catch (const std::exception& error) {
+    } catch (const std::runtime_error& error) {
         none.obstacle = error.what();
     }
     return none;

@@ -207,7 +207,7 @@ candidates look_at_candidates() {
             latest && !latest->empty() ? describe(*latest, system) : std::nullopt};
 }
 
-// Of the same finding, also of a warning that a second look prints with the error of another call.
+// Also a warning that a second look repeats with the left-over error of another call.
 void drop_repetitions(std::vector<std::string>& findings) {
     const std::set<std::string> all(findings.begin(), findings.end());
     std::set<std::string> known;
