@@ -251,8 +251,9 @@ status, in order||in_order|0|fits
 - no compiled zone|echo x >$s/tz/2016d/zoneinfo/Europe/Paris|told .findings[]|0|leads to no compiled zone file: local
 - local time that others read|mkdir root/etc; ln -s /usr/share/zoneinfo.default/UTC root/etc/localtime; rm $s/zoneinfo|
     told .findings|0|leads to no compiled zone file."
-- what programs read|mkdir root/etc; ln -s /var/db/timezone/localtime root/etc|
-    told '[.readers[].follows]'|0|[false,true]
+- what programs read|mkdir root/etc; ln -s /var/db/timezone/localtime root/etc;
+    ln -s /var/db/timezone/zoneinfo root/usr/share|told '[.local_zone, .readers[]["path", "follows"]]'|0|
+    ["Europe/Paris","/usr/share/zoneinfo","/etc/localtime",true,true]
 - a link in the place of the updates|mv $s/tz root/; ln -s /tz $s/tz|told .findings[0]|0|tz is a symbolic link
 - no state directory|rm -r $s|told .findings[0]|0|systemd-tmpfiles or the builder
 - older than the system's own data|link @b/zoneinfo zoneinfo|
