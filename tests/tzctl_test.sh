@@ -164,7 +164,8 @@ use||ctl use 2016f|0|Current now: update 2016f.|f f f b d e f g
 - unfinished, then cleanup|ln -s 2016f $s/.tzctl.use.0; link @f/zoneinfo zoneinfo|ctl cleanup|0|2016d|f f f f
 - unfinished, and a failure again|ln -s 2016f $s/.tzctl.use.0|
     disturbed ?rename,?renameat,renameat2:error=EIO:when=1 cleanup|1|output error|d d f b d e f g .tzctl.use.0
-- unfinished, but unfit by now|ln -s 2016e $s/.tzctl.use.0|ctl cleanup|0|2016e has ICU schema|d d f d f
+- unfinished, but unfit by now|ln -s 2016e $s/.tzctl.use.0|ctl cleanup|0|
+    cannot complete "use 2016e": 2016e: the next start would not keep it: 2016e has ICU schema|d d f d f
 cleanup||ctl cleanup|0|Deleted update 2016g|d d f d f
 - nothing|ctl cleanup|ctl cleanup|0|no update
 - as a rehearsal||ctl cleanup --dry-run|0|Would delete update 2016b
