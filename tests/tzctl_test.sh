@@ -172,6 +172,7 @@ cleanup||ctl cleanup|0|Deleted update 2016g|d d f d f
 - how much it frees|head -c 3000000 /dev/zero >$s/tz/2016b/x; ln $s/tz/2016b/{x,y}|ctl cleanup --dry-run|0|b: 3.0 MB
 - what is no update|mkdir $s/tz/{lost+found,.snapshot,2016z.partial,.make-dataset.x}|ctl cleanup|0|2016g|
     d d f .make-dataset.x .snapshot d f lost+found z.partial
+- what its owner must not write to|chmod 555 $s/tz/2016b/zoneinfo|ctl cleanup|0|Deleted update 2016b|d d f d f
 - a local time that leads to itself|link localtime localtime|ctl cleanup --dry-run|0|Would delete update 2016b
 - what is passed on the way|link @g/../2016d/icutz icutz|ctl cleanup|0|2016b|
     d /var/db/timezone/tz/2016g/../2016d/icutz f d f g
