@@ -41,8 +41,8 @@ disturbed() { strace -qqo /dev/null -e inject=$1 "$tzctl" --root root "${@:2}"; 
 mounted() { # FILE-OR-DIRECTORY PLACE MODE VERB: while the one lies over the other
     local as_root=()
     [ "$(id -u)" -eq 0 ] || as_root=(--map-root-user)
-    # shellcheck disable=SC2016 # expanded by sh
-    unshare "${as_root[@]}" --mount --propagation unchanged sh -c '
+    # shellcheck disable=SC2016,SC2086 # expanded by sh; there may be several words, or none
+    ${before-} unshare "${as_root[@]}" --mount --propagation unchanged sh -c '
         mount --bind "$1" "$2" && mount -o "remount,bind,$3" "$2" || exit
         "$0" --root root "$4" && status=0 || status=$?
         umount $(grep -o " $PWD/root[^ ]*" /proc/mounts)
@@ -188,6 +188,9 @@ cleanup||ctl cleanup|0|Deleted update 2016g|d d f d f
     tzctl: root/var/db/timezone/tz/|d d f .tzctl.* d f
 - a mount point|cp -r root/usr/share/icu root/x; mkdir $s/tz/2016b/x|
     mounted root/x $s/tz/2016b/x rw cleanup; ls root/x|0|icutzformat.txt|d d f .tzctl.* d f
+- a mount point, without openat2|mkdir $s/tz/2016b/x|
+    before="strace -fqqo /dev/null -e inject=openat2:error=ENOSYS" mounted root/usr/share $s/tz/2016b/x rw cleanup|1|
+    /x: a mount point|d d f .tzctl.* d f
 - what cannot be read||disturbed getdents64:error=EIO:when=1+ cleanup|1|root/var/db/timezone
 status, in order||in_order|0|fits
 - coloured||coloured_lines NO_COLOR=|0|4
