@@ -375,8 +375,6 @@ FTS* platform::fts_open(char* const* roots, int options) {
     FTS* const walk = ::fts_open(real_roots.data(), options, nullptr);
     if (walk == nullptr) {
         note_failure(*roots);
-    } else {
-        errno = 0;
     }
     return walk;
 }
