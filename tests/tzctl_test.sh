@@ -288,6 +288,7 @@ no verb||ctl frobnicate|2|frobnicate
 an option of another verb||ctl install --json 2016h|2|--json
 two verbs||ctl status cleanup|2|cleanup
 make||"$tzctl" make frobnicate|2|usage: tzctl make update
+- with its operands and no others||MALLOC_PERTURB_=1 "$tzctl" make update a b c|1|a: not a readable file
 - with an image||ctl make update|2|--root
 - where its script is not|mkdir -p a/b tools; cp "$tzctl" a/b; echo echo run >tools/make-dataset; chmod +x tools/*|
     a/b/tzctl make update a b c|1|make-dataset: No such file
