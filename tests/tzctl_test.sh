@@ -270,7 +270,7 @@ check||ctl check|0|TZDATA OK - update 2016d is current, the next start adopts up
 - findings|rm $s/icutz $s/localtime|ctl check|1|
     TZDATA WARNING - The ICU link does not lead into the current update: "tzctl use" corrects that (and 1 more)
 - old data|link @b/zoneinfo zoneinfo; link @b/icutz icutz|ctl check|1|TZDATA WARNING - The current update is older
-- a start that fails|rm $s/{icutz,localtime}; mkdir -p $s/localtime/x|ctl check|2|TZDATA CRITICAL - The next start fails (and
+- a start that fails|rm $s/{icutz,localtime}; mkdir -p $s/localtime/x|ctl check|2|TZDATA CRITICAL - The next start fails
 - printed to nowhere||ctl check >&-|3|standard output
 - no zones in what comes next|rm -r $s/tz/2016f/zoneinfo|ctl check|1|will show UTC
 - no zones|rm -r $s/tz/2016d/zoneinfo|ctl check|2|TZDATA CRITICAL - The current link leads to no zone file
