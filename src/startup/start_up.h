@@ -18,9 +18,9 @@ struct outcome {
 /// The warning line with which main reports that start_up threw.
 inline constexpr char gave_up[] = "Could not set all time-zone links";
 
-/// One start: decides which time-zone data is current and makes the links say so. Every failure on
-/// the way ends with the system's own data being current. Throws only if that, or the link to the
-/// default zone after it, could not be done either; a warning line has then said why.
+/// One start: decides which time-zone data is current, and sets the links accordingly. A failure on
+/// the way makes the system's own data current. Throws only if that fails, too, or if the link to
+/// the default zone cannot be created; at least one warning line has then been written.
 outcome start_up();
 
 } // namespace tz
