@@ -29,7 +29,7 @@ struct comparison {
     std::time_t end = 0;   // exclusive
     std::optional<std::string> local_zone;
     std::optional<std::string> next_local_zone; // if the next start replaces the local-time link
-    bool local_time_follows = true;             // the data that is compared
+    bool local_time_follows = true;             // whether local time is read from the data compared
     zone_differences found;
     std::string obstacle; // why nothing could be compared
 };
@@ -39,8 +39,8 @@ struct comparison {
 /// needs the machine's "/proc". Throws std::exception.
 [[nodiscard]] comparison compare(std::vector<operand> operands);
 
-/// What the next start changes for clocks; with an obstacle if something for that is missing or
-/// refused. Throws other failures. Leaves the image, too.
+/// What the next start changes for clocks. If nothing can be compared because something is missing
+/// or refused, `obstacle` is the message. Throws other failures. Leaves the image, too.
 [[nodiscard]] comparison effect_of_next_start();
 
 } // namespace tz

@@ -10,7 +10,7 @@
 /// usually a path, as the caller of tzctl would type it.
 namespace tz {
 
-/// Throws the error `errno`, about `what`, if `result`, as of a system call, is -1.
+/// If `result`, that of a system call, is -1: throws the error in `errno`, about `what`.
 inline void check(ssize_t result, const std::string& what) {
     if (result == -1) {
         throw std::system_error(errno, std::generic_category(), what);

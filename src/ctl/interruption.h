@@ -4,7 +4,7 @@
 namespace tz::interruption {
 
 /// From now on SIGHUP, SIGINT and SIGTERM, unless they are ignored, no longer end the process at
-/// once, so that it can put things in order. They still interrupt a call that waits.
+/// once, so that it can restore a consistent state. They still interrupt a call that waits.
 void defer();
 
 /// Throws if one of them has arrived.

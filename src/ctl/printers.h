@@ -16,8 +16,8 @@ void print_as_json(const survey& found);
 void print_for_people(const comparison& done);
 void print_as_json(const comparison& done);
 
-/// Prints for people in a line or two what the next start, with which `done` compares, means for
-/// local time.
+/// Prints for people, in a line or two, what the next start means for local time. `done` compares
+/// the current data with that of the next start.
 void print_effect(const comparison& done);
 
 } // namespace tz

@@ -31,7 +31,7 @@ struct dataset {
     return data.version + " is a version with a number beyond 2147483647.";
 }
 
-/// The datasets between which a start decides, as far as they exist.
+/// The datasets between which a start decides; nothing for one that does not exist.
 struct candidates {
     std::optional<dataset> system;
     std::optional<dataset> current;
@@ -49,7 +49,7 @@ struct link {
 /// Where programs look for zones, or for local time.
 struct reader {
     link place;
-    bool follows = false; // whether the current link is on its way
+    bool follows = false; // whether the way from there passes the current link
 };
 
 struct survey {
@@ -63,10 +63,10 @@ struct survey {
     reader etc_localtime;
     std::optional<std::string> local_zone;
     bool current_has_zones = false;
-    bool marker = false; // an update may be removed
+    bool marker = false; // whether the clean-up marker exists
     std::optional<std::string> record;
     prediction next_start;
-    std::vector<std::string> findings; // problems, then the warnings printed while looking
+    std::vector<std::string> findings; // problems, then warning lines of the look itself
 };
 
 /// Looks at everything, and changes nothing. Throws std::exception if something cannot be looked
@@ -77,13 +77,14 @@ struct survey {
 /// empty.
 [[nodiscard]] std::string release_in(const fs::descriptor& dataset, const std::string& component);
 
-/// What the next start does once these links are replaced, and the datasets that it considers.
+/// What the next start does, and the datasets that it considers.
 struct foresight {
     candidates considered;
     prediction start;
 };
 
-/// Throws std::system_error if a link cannot be replaced, or if a look at the disk fails.
+/// Predicts the next start after the `wanted` links are in place. Throws std::system_error if a
+/// link cannot be replaced, or if a look at the disk fails.
 [[nodiscard]] foresight foresee(const std::vector<wanted_link>& wanted);
 
 } // namespace tz

@@ -22,7 +22,7 @@ namespace tz {
 /// and 80 where there is no terminal; each after `indent` blanks.
 [[nodiscard]] std::string wrapped(const std::string& text, std::size_t indent = 0);
 
-/// A name for people of the dataset at `path`, such as "update 2016d.1.0".
+/// What messages call the dataset at `path`, such as "update 2016d.1.0".
 [[nodiscard]] std::string dataset_name(const std::string& path);
 
 /// What a start does, such as "adopts update 2016d.1.0".

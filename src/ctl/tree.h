@@ -62,9 +62,9 @@ void for_each_zone_name(const fs::descriptor& zoneinfo, const std::string& shown
 /// The number of bytes on the disk that removing everything below `directory` frees.
 [[nodiscard]] double size(const fs::descriptor& directory, const std::string& shown);
 
-/// Removes the entry `name` of `directory`, and everything below it on the same file system,
-/// however deep. Reports by `failed`, with a path that begins with `shown`, what could not be
-/// removed, with `errno` set, and goes on. Returns whether the entry is gone.
+/// Removes the entry `name` of `directory`, and everything below it on the same mount, however
+/// deep. For what cannot be removed it calls `failed` with a path that begins with `shown`, and
+/// with `errno` set, and continues. Returns whether the entry is gone.
 bool remove(int directory, const std::string& name, const std::string& shown,
             const std::function<void(const std::string&)>& failed);
 

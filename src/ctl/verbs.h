@@ -12,8 +12,8 @@ namespace tz {
 
 /// Installs the dataset in the directory `source`, which the caller calls `shown`, as the update
 /// `version`, and makes it the latest. A crash at any moment leaves the old state or the new, and a
-/// failure the old. Does nothing if the same dataset is installed and the latest already. Refuses
-/// what the next start would not adopt, and what has no zone file, unless `forced`.
+/// failure the old. Changes nothing if the same dataset is installed and the latest already. Unless
+/// `forced`, refuses the datasets that tzctl(8) lists, such as one that no start would adopt.
 void install(const fs::descriptor& source, const std::string& shown, const std::string& version,
              bool forced);
 
@@ -22,7 +22,8 @@ void install(const fs::descriptor& source, const std::string& shown, const std::
 /// what has no zone file. After a failure the links are as before.
 void use(const std::string& version);
 
-/// Completes a `use` that was killed, as far as that is possible now.
+/// Completes a `use` that was killed. If that is refused by now, prints why and forgets it. After
+/// any other failure it stays unfinished, and the std::system_error is thrown.
 void finish_interrupted_use(const work& work);
 
 /// Prints one line for a monitoring system, in the form of its plugins, and returns the exit status
@@ -33,7 +34,7 @@ void finish_interrupted_use(const work& work);
 /// The line and the status for what cannot be checked.
 [[nodiscard]] int print_unknown(const std::string& why);
 
-/// Deletes the installed updates that are not in use; with `rehearsed`, only lists them. Names on
+/// Deletes the installed updates that are not in use; with `rehearsed`, only lists them. Reports on
 /// standard error what cannot be deleted, and returns false then.
 [[nodiscard]] bool clean_up(bool rehearsed);
 

@@ -21,10 +21,10 @@ struct way {
         std::string target; // of a link
     };
 
-    std::vector<entry> passed; // at last what it leads to
+    std::vector<entry> passed; // the last is what it leads to
     bool leads_somewhere = false;
-    fs::descriptor directory{-1}; // in which the last entry is,
-    std::string name;             // under this name
+    fs::descriptor directory{-1}; // that contains the last entry
+    std::string name;             // of the last entry there
 
     /// Whether every user can follow it to its end, and read what is there.
     [[nodiscard]] bool is_open_to_others() const;

@@ -9,7 +9,7 @@
 
 namespace tz {
 
-/// What replacing one link needs: its path, and its new target, if it is to have one.
+/// A link to replace: its path and its new target. Without a target, it is removed.
 struct wanted_link {
     std::string path;
     std::optional<std::string> target;
@@ -21,9 +21,9 @@ void imagine(const wanted_link& wanted);
 /// The version that a killed tzctl was about to make current.
 [[nodiscard]] std::optional<std::string> unfinished_use();
 
-/// As long as this lives, no other tzctl changes anything, and an interruption ends this one only
-/// where it asks for that. Everything half-made has a temporary name, and is removed at the
-/// beginning, whoever left it, and at the end. What cannot be removed does no harm.
+/// While this exists, no other tzctl changes anything, and an interruption ends this one only in
+/// interruption::check(). Everything half-made has a temporary name. The constructor and the
+/// destructor remove it, also what a killed tzctl left. What they cannot remove does no harm.
 class work {
   public:
     /// Throws std::exception if another tzctl is running, or if the directory of updates is a

@@ -24,7 +24,7 @@ class descriptor {
     [[nodiscard]] int number() const { return number_; }
     [[nodiscard]] bool is_open() const { return number_ != -1; }
 
-    /// Closes early, for those who want to know how it went: close(2)'s result; 0 if not open.
+    /// Closes early, for callers that need the result: that of close(2), or 0 if not open.
     int close() { return is_open() ? ::close(release()) : 0; }
 
     /// Hands the descriptor over to the caller.

@@ -7,15 +7,15 @@
 #include <sys/stat.h>
 #include <sys/types.h>
 
-// Or a start would fail on files beyond 2 GiB, and on any that is written after January 2038.
+// Otherwise a start would fail on files beyond 2 GiB, and on files written after January 2038.
 static_assert(sizeof(off_t) == 8 && sizeof(ino_t) == 8 && sizeof(time_t) == 8,
               "this needs a C library with 64-bit offsets, inode numbers and times");
 
 /// The few calls with which a start looks at the disk and changes it. Each is the call of the C
 /// library that it is named after: arguments, results and `errno` are the same.
 ///
-/// They exist twice, and the linker picks: in disk.cc for the program that starts machines, and in
-/// tzctl as a simulation (rehearsal/imagination.h), with which it predicts a start by running it.
+/// They exist twice, and each program links one set: tzreconcile that in disk.cc; tzctl a
+/// simulation (rehearsal/imagination.h), with which it predicts a start by running it.
 namespace tz::platform {
 
 int access(const char* path, int mode);

@@ -10,7 +10,7 @@
 /// take the notes into account, also where a path leads through a link that was only noted. So the
 /// code of a start can run without consequences.
 ///
-/// A change succeeds unless what lies on the disk forbids it to root: an entry in the way, a
+/// A change succeeds unless the state of the disk forbids it even to root: an entry in the way, a
 /// directory, a mount point, a file system mounted read-only, an attribute set by chattr(1). A full
 /// disk is not foreseen. Of a file only the first MiB is read, so that nothing on the disk decides
 /// how much memory this takes.
@@ -20,7 +20,7 @@ namespace tz::imagination {
 /// at a time.
 class session {
   public:
-    /// Failures are told with `image` before their paths.
+    /// Error messages have `image` in front of their paths.
     explicit session(std::string image);
     session(const session&) = delete;
     session& operator=(const session&) = delete;
@@ -33,9 +33,9 @@ class session {
     /// bytes, and with an error only where the last call failed.
     [[nodiscard]] std::vector<std::string> take_warnings();
 
-    /// Throws std::system_error if a look at the disk failed for want of memory or descriptors, or
-    /// by an error of the disk or a missing permission. The code that runs here may take that for
-    /// an entry that is not there, so what it concluded is worth nothing then.
+    /// Throws std::system_error if a look at the disk failed because memory or descriptors ran out,
+    /// or because of a disk error or a missing permission. The code of a start may take that for a
+    /// missing entry, so its result is then invalid.
     void check() const;
 
   private:

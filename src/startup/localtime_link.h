@@ -4,7 +4,7 @@
 namespace tz {
 
 /// Makes the local-time link lead through the zoneinfo link, so that local time follows the current
-/// data. A link that does stays, whether or not its zone exists. A link into the legacy tz database
+/// data. Such a link stays, whether or not its zone exists. A link into the legacy tz database
 /// is corrected if the current data has that zone. Anything else is replaced by a link to the
 /// default zone. Both changes give warning lines.
 ///

@@ -9,8 +9,8 @@ namespace tz {
 void prepare_state_directories();
 
 /// Moves the ICU link from its legacy place to its present one, its text unchanged, unless there is
-/// a link already; then deletes the legacy one, whatever came of that. A legacy link whose target
-/// is missing stays. Failures give warning lines.
+/// a link already; then deletes the legacy one, even if that failed. A legacy link whose target is
+/// missing stays. Failures give warning lines.
 void migrate_legacy_icu_link();
 
 } // namespace tz

@@ -10,8 +10,8 @@ namespace tz {
 void touch_needs_cleanup();
 
 /// Rewrites the record of the last adoption: the version of the dataset that was replaced, "_", and
-/// the version of the update that replaced it, without a newline. A failure is silent, and a FIFO
-/// that nobody reads is one.
+/// the version of the update that replaced it, without a newline. Silent on failure, for example if
+/// the path is a FIFO without a reader.
 ///
 /// Example: 2016a.1.0_2016b.1.0
 void write_version_diff_record(const kiv_dataset& effective, const kiv_dataset& latest);
