@@ -21,7 +21,7 @@ namespace {
 
 constexpr std::time_t ten_years = std::time_t{3652} * 24 * 60 * 60;
 
-// Compares, with a line on the terminal, if there is one, once it takes longer than a second.
+// Compares, and shows the progress on a terminal once that takes longer than a second.
 zone_differences compare_visibly(const zone_directory& from, const zone_directory& to,
                                  std::time_t start, std::time_t end) {
     using clock = std::chrono::steady_clock;
@@ -32,7 +32,8 @@ zone_differences compare_visibly(const zone_directory& from, const zone_director
         interruption::check();
         if (terminal && done % 16 == 0 && clock::now() - begin > std::chrono::seconds(1)) {
             printed = true;
-            std::cerr << "Compared " << done << " of " << all << " zones\r"; // and over it the next
+            // The next line overwrites this one.
+            std::cerr << "Compared " << done << " of " << all << " zones\r";
         }
     });
     std::cerr << (printed ? "\x1b[K" : "");

@@ -200,7 +200,8 @@ int refuse_usage(const CLI::App& app, const CLI::ParseError& error) {
     return 2;
 }
 
-// The words as CLI11 takes them, which would take the word after "--root=" for the directory.
+// The words in CLI11's order. An empty one follows "--root=", or CLI11 would take the next word for
+// the directory.
 std::vector<std::string> last_first(int count, char** words) {
     std::vector<std::string> all;
     for (int at = count - 1; at > 0; --at) {

@@ -207,7 +207,7 @@ candidates look_at_candidates() {
             latest && !latest->empty() ? describe(*latest, system) : std::nullopt};
 }
 
-// Also a warning that a second look repeats with the left-over error of another call.
+// Drops a finding that is there twice. One of the two may end with the error of an unrelated call.
 void drop_repetitions(std::vector<std::string>& findings) {
     const std::set<std::string> all(findings.begin(), findings.end());
     std::set<std::string> known;
@@ -220,8 +220,7 @@ void drop_repetitions(std::vector<std::string>& findings) {
 
 } // namespace
 
-// Unlike a start's own way to the word, this one leads out of no dataset, since the word is
-// printed.
+// Unlike a start, this follows no link: the word is printed, and must not come from another file.
 std::string release_in(const fs::descriptor& dataset, const std::string& component) {
     const auto directory = tree::open_directory(dataset.number(), component.substr(1), component);
     return directory ? word_in(directory->number(), version_file.substr(1)) : "";

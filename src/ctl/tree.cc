@@ -68,7 +68,7 @@ void for_each_name(fs::descriptor directory, const std::string& shown,
     }
 }
 
-// Visits every entry, a directory before what is in it; returns whether a visit said stop.
+// Visits every entry, a directory before what is in it; returns whether a visit returned stop.
 bool walk(fs::descriptor directory, const std::string& shown, const std::string& parent, int levels,
           const std::function<next(const item&)>& visit) {
     bool stopped = false;
@@ -149,7 +149,7 @@ void copy_item(const item& entry, int copy, const std::string& shown) {
     }
 }
 
-// Now that every entry is there, and nobody else can change it.
+// For the complete copy, which nobody else can change.
 void check_links(const fs::descriptor& copy, const std::string& shown) {
     (void)walk(copy, shown, [&](const item& entry) {
         if (S_ISLNK(entry.status.st_mode) &&
@@ -205,7 +205,7 @@ bool is_equal(const item& entry, const fs::descriptor& own, const std::string& s
     return have_same_contents(theirs, mine, shown);
 }
 
-// Visits what is no directory where programs look for zones, until a visit returns true.
+// Visits every entry but directories where programs look for zones, until a visit returns true.
 bool walk_zones(const fs::descriptor& zoneinfo, const std::string& shown,
                 const std::function<bool(const item&)>& visit) {
     return walk(zoneinfo, shown, [&](const item& entry) {
@@ -216,7 +216,7 @@ bool walk_zones(const fs::descriptor& zoneinfo, const std::string& shown,
     });
 }
 
-// Removes entries, but moves what lies too deep up into the directory where it began.
+// Removes entries. Moves what lies too deep up to the top directory, and removes it from there.
 class remover {
   public:
     remover(int top, const std::function<void(const std::string&)>& failed)
@@ -366,7 +366,7 @@ bool equal(const fs::descriptor& theirs, const fs::descriptor& own, const std::s
 bool is_zone(int directory, const std::string& name, const std::string& shown) {
     struct stat status {};
     check(::fstatat(directory, name.c_str(), &status, AT_SYMLINK_NOFOLLOW), shown);
-    if (status.st_size == 0) { // as of most in /proc, where to open a file may have effects
+    if (status.st_size == 0) { // like most files in /proc; opening one may have effects
         return false;
     }
     const fs::descriptor file = open_regular_file(directory, name);

@@ -50,7 +50,7 @@ foresight make_current(const std::string& version, const work& work) {
     const auto wanted = links_to(path);
     auto next = foresee(wanted);
     const outcome& result = next.start.result;
-    const bool way_out = path.empty(); // also where no start goes well any more
+    const bool way_out = path.empty(); // the system's data is allowed even if every start fails
     if (result.dataset != path || (result.decided != decision::keep && !way_out)) {
         refuse(version, "the next start would not keep it: " + reason(result, next.considered));
     }

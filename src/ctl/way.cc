@@ -34,7 +34,7 @@ bool way::leads_to_zone() const {
 }
 
 way follow(const std::string& path) {
-    constexpr int most_links = 40; // that Linux follows
+    constexpr int most_links = 40; // the limit of Linux
     const std::string shown = in_image(path);
     const auto open_root = [] { return fs::descriptor(::open("/", O_PATH | O_CLOEXEC)); };
     way gone;

@@ -78,7 +78,7 @@ bool may_be_note(int directory, const std::string& name) {
            (::readlinkat(directory, name.c_str(), &none, 1) != -1 || errno != EINVAL);
 }
 
-// For file systems that cannot do it in one step. There always is an entry of the first name.
+// For file systems that cannot do it in one step. Readers find an entry `name` at every moment.
 int exchange_in_steps(int directory, const std::string& name, const std::string& other) {
     const auto rename = [&](const std::string& from, const std::string& to) {
         return ::renameat(directory, from.c_str(), directory, to.c_str());
@@ -113,7 +113,8 @@ int exchange(int directory, const std::string& name, const std::string& other) {
     return result;
 }
 
-// A link, and the name under which what replaces it, and then what it was, lies beside it.
+// A link to replace. Its successor lies beside it under the name `beside`; after the exchange, its
+// predecessor does.
 struct replacement {
     explicit replacement(const wanted_link& link)
         : path(link.path), directory(tree::open(parent_of(path))) {
@@ -179,7 +180,7 @@ work::~work() {
 
 void work::replace(const std::vector<wanted_link>& wanted, const std::string& version) const {
     std::vector<replacement> all;
-    for (const auto& link : wanted) { // everything that needs room
+    for (const auto& link : wanted) { // first all that needs space on the disk
         if (!is_as(link)) {
             all.emplace_back(link);
         }

@@ -32,7 +32,7 @@
 namespace tz {
 namespace {
 
-enum class kind { nothing, link, directory, file }; // of which the last is of any other type
+enum class kind { nothing, link, directory, file }; // `file` is anything else
 
 struct entry {
     kind what = kind::nothing;
@@ -41,7 +41,7 @@ struct entry {
 
 std::map<std::string, entry> imagined; // by paths that do not lead through links
 std::vector<std::string> warnings;
-int unforeseen = 0; // the first `errno` that tells nothing of the disk's state
+int unforeseen = 0; // the first `errno` that does not describe the disk's state
 std::string unforeseen_at;
 std::string last_opened;
 std::new_handler former_new_handler = nullptr;
@@ -65,7 +65,7 @@ int succeed(int result = 0) {
     return result;
 }
 
-// After a real call has failed: `errno` may say what lies on the disk, or that nobody can know.
+// Called after a real call has failed. Notes an `errno` that does not describe the disk's state.
 void note_failure(const std::string& path) {
     constexpr std::array of_the_disk{ENOENT, ENOTDIR, ELOOP, ENAMETOOLONG};
     if (unforeseen == 0 && std::count(of_the_disk.begin(), of_the_disk.end(), errno) == 0) {
@@ -78,7 +78,7 @@ std::string parent_of(const std::string& path) {
     return path.substr(0, path.find_last_of('/'));
 }
 
-// What is at a path without links on the way; nothing, with errno set, if that cannot be told.
+// What is at a path without links on the way; nothing, with errno set, if that is unknown.
 std::optional<place> look_at(const std::string& path) {
     if (const auto change = imagined.find(path); change != imagined.end()) {
         return place{path, change->second};
@@ -100,7 +100,7 @@ std::optional<place> look_at(const std::string& path) {
     return place{path, {kind::link, {target.data(), static_cast<std::size_t>(length)}}};
 }
 
-// What the entry `name` of a directory is; nothing, with errno set, if that cannot be told.
+// What the entry `name` of a directory is; nothing, with errno set, if that is unknown.
 std::optional<place> look_in(const place& directory, const std::string& name) {
     if (name.empty() || name == ".") {
         return directory;
@@ -113,7 +113,7 @@ std::optional<place> look_in(const place& directory, const std::string& name) {
 // element may be absent, and if it is a link, that is followed or not. Nothing, with errno set, if
 // the path leads nowhere.
 std::optional<place> place_of(std::string path, bool follow_last) {
-    constexpr int most_links = 40; // that Linux follows
+    constexpr int most_links = 40; // the limit of Linux
     int links = 0;
     place at{"", {kind::directory}};
     while (!path.empty()) {
@@ -173,7 +173,7 @@ bool is_empty(const place& directory) {
            std::none_of(imagined.begin(), imagined.end(), is_new);
 }
 
-// Removes what is at a place; of a directory only an empty one, and only where that is `allowed`.
+// Removes what is at a path; a directory only if it is empty and `directory_allowed`.
 int remove_entry(const char* path, bool directory_allowed) {
     const auto found = place_of(path, false);
     if (!found) {
@@ -199,14 +199,15 @@ int remove_entry(const char* path, bool directory_allowed) {
     return succeed();
 }
 
-// Whoever makes updates decides where their files lead, but a start uses no word in any of them.
+// The links in an update may lead to any file. A start makes no use of such a file's contents, so
+// tzctl does not open it.
 bool leads_out_of_updates(const std::string& path, const place& found) {
     const auto updates = place_of(layout::updates_directory, true);
     return path.starts_with(layout::updates_directory) && updates &&
            !found.path.starts_with(updates->path);
 }
 
-// A descriptor of which nobody can read or write anything.
+// A descriptor from which nothing can be read, and to which nothing can be written.
 int open_nothing() {
     const int nothing = ::open("/", O_RDONLY | O_CLOEXEC);
     if (nothing == -1) {
@@ -215,7 +216,7 @@ int open_nothing() {
     return nothing;
 }
 
-// The contents of a file: itself, or what of a large one is read.
+// A descriptor for a file's contents: of the file itself, or of a copy of a large one's beginning.
 int open_contents(const std::string& path) {
     constexpr off_t most = 1 << 20;
     fs::descriptor file = open_regular_file(AT_FDCWD, path);
@@ -239,7 +240,7 @@ int open_contents(const std::string& path) {
 } // namespace
 
 imagination::session::session(std::string image) : image_(std::move(image)) {
-    warnings.clear(); // of those who looked before
+    warnings.clear(); // of looks without a session
     former_new_handler = std::set_new_handler([] {
         unforeseen = ENOMEM;
         throw std::bad_alloc();
@@ -380,7 +381,7 @@ FTS* platform::fts_open(char* const* roots, int options) {
 }
 
 FTSENT* platform::fts_read(FTS* walk) {
-    errno = 0; // which is the only trace that a directory which could not be read leaves
+    errno = 0; // only errno shows that fts could not read a directory
     FTSENT* const found = ::fts_read(walk);
     if (found != nullptr &&
         (found->fts_info == FTS_DNR || found->fts_info == FTS_ERR || found->fts_info == FTS_NS)) {
