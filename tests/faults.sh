@@ -1,9 +1,9 @@
 #!/usr/bin/env bash
 # SPDX-License-Identifier: BSD-2-Clause
 # usage: faults.sh BUILD-DIRECTORY "START..." DISTURBANCE...
-# Disturbs every system call of each START in turn, as strace's option "inject" says it: the call
-# fails, or the program is killed on its way in. The verbs "install", "use" and "cleanup" of
-# tzctl are disturbed like a start.
+# Disturbs every system call of each START in turn. DISTURBANCE is an action of strace's option
+# "inject": error=EIO makes the call fail, signal=KILL kills the program as it enters the call. A
+# START may also be the verb "install", "use" or "cleanup" of tzctl.
 set -euo pipefail
 PATH=$PATH:/usr/sbin:/sbin # where chroot is, for an ordinary user
 if [ "$(id -u)" -ne 0 ]; then
@@ -53,7 +53,7 @@ run() { # OPTION-OF-STRACE COMMAND...
 
 disturb_every_call() { # CHECK-OF-WHAT-IS-LEFT COMMAND...
     run trace=%file,%desc,%signal "${@:2}"
-    # Those from the first of main on, numbered among all calls of the same name.
+    # The calls from the first in main on, each numbered among all calls of the same name.
     awk -F '(' -v untouched="^($untouched)$" '
         { number[$1]++ }
         /^fcntl\(0, F_GETFD/ { started = 1 }
@@ -78,8 +78,8 @@ usable() { # VAR
     target=$(readlink "$1/db/timezone/zoneinfo") && [ -e "root$target/+VERSION" ]
 }
 
-# Usable data stays usable, but for a death between a link's removal and creation, which the next
-# start mends.
+# Usable data stays usable, unless the program is killed between a link's removal and creation. The
+# next start repairs that.
 survived() {
     case $status in
     0) usable root/var ;;
@@ -96,7 +96,7 @@ disturb_start() {
 
     run trace=none "${tzreconcile[@]}"
     rm -rf after && mv root/var after
-    put_back given # Nobody reads the warnings, files must stay empty, few may be open.
+    put_back given # No reader of the warnings, no byte in a file, few descriptors.
     { (ulimit -f 0 -n 5 && sleep 0.1 && exec "${tzreconcile[@]}") <&- 2>&1 >&- 3>&- 4>&- | : &&
         diff -r --no-dereference -x TZVersionDiffRecord after root/var; } || fail "hampered"
 }
@@ -105,8 +105,8 @@ is_like() { # STATE WHAT-DOES-NOT-COUNT
     diff -r --no-dereference -x "${2-.tzctl.lock}" "$1" root/var >>said
 }
 
-# A failure leaves the links as they were. After a death, too, every update is whole, and the next
-# tzctl completes what was begun, and clears up what was left.
+# A failure leaves the links as they were. Also after a kill every update is whole, and the next
+# tzctl completes what was begun, and removes the leftovers.
 done_or_not() {
     case $status in
     0) is_like after '.tzctl.*' ;;

@@ -1,6 +1,6 @@
 #!/usr/bin/env python3
 # SPDX-License-Identifier: BSD-2-Clause
-"""Holds what tzctl foretells against what a start then does, on random states of the disk.
+"""Compares what tzctl predicts with what a start then does, on random states of the disk.
 
 usage: prediction_test.py BUILD-DIRECTORY [STATES [SEED]]
 
@@ -47,7 +47,7 @@ linked_icu = {"/icutz": ["->@/icutz", "->~/icutz", "->/var/db/icutz", *oddities]
 
 
 def some_bytes(chance):
-    """A few bytes, many of them in no text; none ends a name or a line."""
+    """A few bytes, many of them odd in a text; none ends a name or a line."""
     likely = b"\\x5c\\\xff\xe9\xed\xa0\x80\x1b\xe2\x80\xae\x7f"
     some = [chance.choice(likely) if chance.random() < 0.7 else chance.randrange(1, 256)
             for _ in range(chance.randrange(1, 6))]
@@ -104,7 +104,7 @@ def links():
 
 
 def everything():
-    """All that can be told of the disk without looking into it; access times do not count."""
+    """Inode, mode, size and modification time of every entry."""
     return {path: (status.st_ino, status.st_mode, status.st_size, status.st_mtime_ns)
             for top in ("/data", "/usr", "/var") for directory, _, names in os.walk(top)
             for path in [directory] + [directory + "/" + name for name in names]
@@ -112,7 +112,7 @@ def everything():
 
 
 def what_happened(before, status, said):
-    """In the words of tzctl, judged by what a start has left behind and said."""
+    """What a start did, in the keys of tzctl: concluded from its links and its warnings."""
     zoneinfo, icutz, localtime = links()
     in_update = (zoneinfo or "").startswith("/var/db/timezone/tz/")
     if status != 0:
@@ -131,7 +131,7 @@ def what_happened(before, status, said):
 
 
 def as_on_disk(told):
-    """What tzctl tells, with every text as the bytes that it stands for."""
+    """The output of tzctl, with each text as the bytes that it stands for."""
     if isinstance(told, dict):
         return {key: as_on_disk(value) for key, value in told.items()}
     if isinstance(told, list):
@@ -141,7 +141,7 @@ def as_on_disk(told):
 
 
 def agree(decision, current, latest):
-    """Whether a start that has found this of the two links can have decided so."""
+    """Whether these verdicts on the two links can lead to this decision."""
     if decision == "keep":
         return current == "fits" and latest not in ("fits", "failed")
     if decision == "drop":
@@ -150,8 +150,8 @@ def agree(decision, current, latest):
 
 
 def run_in_turn(build, root, leave_root):
-    """Two functions: one runs tzctl's status, from outside of the root directory, the other a start,
-    which a static program does inside, where nothing else is."""
+    """Two functions: one runs tzctl's status from outside of the root directory; the other runs a
+    start: inside, if the program is static and so needs no libraries there."""
     def run(leave, *command):
         return subprocess.run(command, capture_output=True, timeout=60, check=False,
                               preexec_fn=leave_root if leave else None)
@@ -165,7 +165,7 @@ def run_in_turn(build, root, leave_root):
 
 
 def check(number, foretell, start_up):
-    """Lays out one state, and has it foretold and started; returns the decision."""
+    """Lays out one state, predicts the start, and runs it; returns the decision."""
     lay_out(random.Random(number))
     before, disk = links(), everything()
     looked = foretell()

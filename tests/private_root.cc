@@ -61,7 +61,7 @@ void lay_out(const tree& entries) {
             fs::create_directory(path);
         }
     }
-    ::alarm(60); // for the test: whatever hangs dies of it
+    ::alarm(60); // ends a test that hangs
 }
 
 tree state() {
@@ -96,7 +96,7 @@ std::string warnings_of(const std::function<void()>& action) {
 } // namespace tz::test
 
 int main(int count, char** arguments) {
-    if (::geteuid() != 0) { // but anybody is root in a user namespace of their own
+    if (::geteuid() != 0) { // an ordinary user becomes root in a user namespace
         std::string unshare = "unshare";
         std::string option = "--map-root-user";
         std::vector<char*> command{unshare.data(), option.data()};
@@ -112,7 +112,7 @@ int main(int count, char** arguments) {
         return 1;
     }
     const int result = RUN_ALL_TESTS();
-    // Back to where leaks and coverage can be looked into.
+    // Leak detection and coverage need the former root.
     const bool is_back = ::fchdir(outside) == 0 && ::chroot(".") == 0;
     fs::remove_all(root);
     return is_back ? result : 1;

@@ -14,7 +14,7 @@
 
 int program_main(); // main of the program, renamed
 
-// Memory that runs out when it is asked for between these times; never, to begin with.
+// The numbers of the first and the last allocation that fail, at first none; and of the latest.
 int first_failing = 0;
 int last_failing = 0;
 int allocations = 0;
@@ -37,8 +37,8 @@ void operator delete(void* memory, std::size_t /*size*/) noexcept {
 
 namespace tz {
 
-// Instead of the platform's own: a directory in the class has another in it, which is called like
-// the class; a file made in the class holds that.
+// These replace the platform's data protection, and leave the number of the class where a test can
+// see it: as a subdirectory's name in a directory, and as the text of a new file.
 int platform::set_protection_class(int descriptor, int protection_class) {
     ::mkdirat(descriptor, std::to_string(protection_class).c_str(), 0755);
     return -1;
@@ -98,7 +98,7 @@ std::string links_to(const std::string& update) {
 const std::string adopted = links_to("2016d") + record + "2016c.1.0_2016d";
 
 const struct {
-    std::string given; // beside what there was before
+    std::string given; // laid out over `before`
     std::string warnings;
     std::string changes; // made by the start
     int status = 0;
@@ -127,17 +127,17 @@ const struct {
     {"tz_latest->@2016e", refused + "2016e vs. 2016c.1.0\n", ""},
     {"tz_latest->@2016f", no_icu + "2016f\n" + refused + "2016f vs. 2016c.1.0\n", ""},
 
-    // Without a current link that makes sense, the system's data is current.
+    // If the current link names no dataset, the system's data becomes current.
     {"zoneinfo!, tz_latest->@2016a, localtime!",
      bad + "\n" + invalid + refused + "2016a vs. 2016c.1.0\n" + resetting,
      system_data + ", " + los_angeles},
     {"zoneinfo->@/zoneinfo, tz_latest->@2016d", bad + "/var/db/timezone/tz//zoneinfo\n" + invalid,
      adopted},
-    {"zoneinfo->@x/", // the shortest that makes sense
+    {"zoneinfo->@x/", // the shortest that names a dataset
      unparsed + "x, results.size() = 0\n" + unparsed + "x\n" + no_icu + "x\n" + dropped,
      system_data + marker},
 
-    // Whatever fails ends with the system's data; what was done before that stays.
+    // After any failure the system's data becomes current; what was done before that stays.
     {"zoneinfo!, icutz->/x, tz_latest=x", not_read + "tz_latest\n" + failed,
      system_data + ", icutz!"},
     {"zoneinfo->@2016a/x, tz_latest->@9999999999a", dropped + failed, system_data + marker},

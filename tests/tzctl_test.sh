@@ -1,7 +1,7 @@
 #!/bin/bash
 # SPDX-License-Identifier: BSD-2-Clause
-# Asks tzctl, in the build directory named as the argument, for all that it can do, and for much that
-# it must refuse, in a root directory laid out anew for each row.
+# usage: tzctl_test.sh BUILD-DIRECTORY
+# Tests what tzctl does and what it refuses, in a root directory laid out anew for each row.
 set -eu
 tzctl=$(realpath "$1")/tzctl
 work=$(mktemp -d)
@@ -38,7 +38,7 @@ mv "$PWD" "$work/given"
 ctl() { "$tzctl" --root root "$@"; }
 # shellcheck disable=SC2086 # there may be several options
 disturbed() { strace -qqo /dev/null -e inject=$1 "$tzctl" --root root "${@:2}"; } # HOW VERB...
-mounted() { # FILE-OR-DIRECTORY PLACE MODE VERB: while the one lies over the other
+mounted() { # FILE-OR-DIRECTORY PLACE MODE VERB: runs the verb with the former mounted on the latter
     local as_root=()
     [ "$(id -u)" -eq 0 ] || as_root=(--map-root-user)
     # shellcheck disable=SC2016,SC2086 # expanded by sh; there may be several words, or none
@@ -61,8 +61,8 @@ left() { # the versions in the links; the updates; what a tzctl has left behind
 
 "$tzctl" --root "$work/given/root" >/dev/null # or it says what is missing, such as user namespaces
 failures=0
-# A line that is indented goes on with the row before. Without anything in the last column, nothing
-# may be left that was not there before the command.
+# An indented line continues the row before it. If the last column is empty, the command must leave
+# the links and the updates as they were.
 while IFS='|' read -r about setup command status said after; do
     rm -rf "$work/now" && cp -a "$work/given" "$work/now" && cd "$work/now"
     if ! eval "$setup" >/dev/null; then
@@ -127,15 +127,15 @@ install||ctl install 2016h|0|adopts update 2016h|d d h b d e f g h
 - an interruption||disturbed sendfile:signal=INT:when=1 install 2016h|130|nterrupted
 - a link that cannot be looked at|ln -s Europe 2016h/zoneinfo/x|disturbed openat2:error=EIO:when=1 install 2016h|1|
     2016h/zoneinfo/x: Input/output error
-- whose effect cannot be told||disturbed memfd_create:error=EMFILE install 2016h|0|Too many open|d d h b d e f g h
+- whose effect cannot be determined||disturbed memfd_create:error=EMFILE install 2016h|0|Too many open|d d h b d e f g h
 - a link that cannot be replaced||disturbed ?rename,?renameat,renameat2:error=EIO:when=2 install 2016h|1|
     root/var/db/timezone/tz_latest: Input/output error
-- a name that comes up meanwhile||{ sleep 0.4; mkdir $s/tz/2016h; } &
+- a name that appears meanwhile||{ sleep 0.4; mkdir $s/tz/2016h; } &
     disturbed ?rename,?renameat,renameat2:delay_enter=800000:when=1 install 2016h|1|tz/2016h: |d d f b d e f g h
 - where renaming has no flags||disturbed renameat2:error=EINVAL install 2016h|0|adopts|d d h b d e f g h
-- what cannot be brought onto the disk||disturbed ?sync,syncfs:error=EIO install 2016h|1|Input/output error
-- beside another||exec {lock}<>$s/.tzctl.lock; flock $lock; ctl install 2016h|1|another tzctl is running
-- beside whoever may read the directory||exec {lock}<$s; flock -s $lock; ctl install 2016h|0|adopts|
+- what cannot be written to the disk||disturbed ?sync,syncfs:error=EIO install 2016h|1|Input/output error
+- while another tzctl runs||exec {lock}<>$s/.tzctl.lock; flock $lock; ctl install 2016h|1|another tzctl is running
+- while a reader locks the directory||exec {lock}<$s; flock -s $lock; ctl install 2016h|0|adopts|
     d d h b d e f g h
 - a lock that leads elsewhere|ln -s /x $s/.tzctl.lock|ctl install 2016h|1|.tzctl.lock
 use||ctl use 2016f|0|Current now: update 2016f.|f f f b d e f g
@@ -156,15 +156,15 @@ use||ctl use 2016f|0|Current now: update 2016f.|f f f b d e f g
 - and a link cannot be replaced|rm $s/tz_latest; touch $s/tz_latest|
     for n in {1..6}; do disturbed "renameat2:error=EINVAL -e inject=?rename,renameat:error=EIO:when=$n" use 2016f; done|
     1|output error
-- and none can be put back|rm $s/tz_latest|
+- and none can be restored|rm $s/tz_latest|
     disturbed "renameat2:error=EINVAL -e inject=?rename,renameat:error=EIO:when=2+" use 2016f; ctl cleanup|0|2016d|
     f f f f
-- what cannot be brought onto the disk||disturbed ?sync,syncfs,fsync:error=EIO use 2016f|1|Input/output error
+- links that cannot be written to the disk||disturbed ?sync,syncfs,fsync:error=EIO use 2016f|1|Input/output error
 - unfinished|ln -s 2016f $s/.tzctl.use.0|told .findings[]|0|tzctl use 2016f
 - unfinished, then cleanup|ln -s 2016f $s/.tzctl.use.0; link @f/zoneinfo zoneinfo|ctl cleanup|0|2016d|f f f f
 - unfinished, and a failure again|ln -s 2016f $s/.tzctl.use.0|
     disturbed ?rename,?renameat,renameat2:error=EIO:when=1 cleanup|1|output error|d d f b d e f g .tzctl.use.0
-- unfinished, but unfit by now|ln -s 2016e $s/.tzctl.use.0|ctl cleanup|0|
+- unfinished, but refused by now|ln -s 2016e $s/.tzctl.use.0|ctl cleanup|0|
     cannot complete "use 2016e": 2016e: the next start would not keep it: 2016e has ICU schema|d d f d f
 cleanup||ctl cleanup|0|Deleted update 2016g|d d f d f
 - nothing|ctl cleanup|ctl cleanup|0|no update
@@ -173,18 +173,18 @@ cleanup||ctl cleanup|0|Deleted update 2016g|d d f d f
 - what is no update|mkdir $s/tz/{lost+found,.snapshot,2016z.partial,.make-dataset.x}|ctl cleanup|0|2016g|
     d d f .make-dataset.x .snapshot d f lost+found z.partial
 - what its owner must not write to|chmod 555 $s/tz/2016b/zoneinfo|ctl cleanup|0|Deleted update 2016b|d d f d f
-- a local time that leads to itself|link localtime localtime|ctl cleanup --dry-run|0|Would delete update 2016b
-- what is passed on the way|link @g/../2016d/icutz icutz|ctl cleanup|0|2016b|
+- a local-time link that leads to itself|link localtime localtime|ctl cleanup --dry-run|0|Would delete update 2016b
+- an update that a link passes|link @g/../2016d/icutz icutz|ctl cleanup|0|2016b|
     d /var/db/timezone/tz/2016g/../2016d/icutz f d f g
 - a link to an update|mv $s/tz/2016b root/; ln -s ../../../../2016b $s/tz/2016b|
     ctl cleanup; cat root/2016b/zoneinfo/Europe/Paris|0|TZif|d d f b d f
-- what a linked update passes|rm -r $s/tz/2016d; ln -s 2016g $s/tz/2016d; link tz/2016d/../2016b tz_latest|
+- an update that a linked one passes|rm -r $s/tz/2016d; ln -s 2016g $s/tz/2016d; link tz/2016d/../2016b tz_latest|
     ctl cleanup|0|2016e|d d tz/2016d/../2016b b d g
-- a local time by too long a name|link $(printf %0300d 0) localtime|ctl cleanup --dry-run|0|Would delete update 2016b
+- a local-time link with too long a target|link $(printf %0300d 0) localtime|ctl cleanup --dry-run|0|Would delete update 2016b
 - a current link to nowhere|link nowhere zoneinfo|ctl cleanup|1|root/var/db/timezone/zoneinfo: names no dataset
 - no latest link that can be read|rm $s/tz_latest; touch $s/tz_latest|ctl cleanup|1|root/var/db/timezone/tz_latest:
 - an interruption||disturbed ?rename,?renameat,renameat2:signal=TERM:when=1 cleanup|143||d d f d e f g
-- what has a mount point in it, and others|mkdir $s/tz/2016b/x|mounted root/usr/share $s/tz/2016b/x rw cleanup|1|
+- an update with a mount point in it, and others|mkdir $s/tz/2016b/x|mounted root/usr/share $s/tz/2016b/x rw cleanup|1|
     tzctl: root/var/db/timezone/tz/|d d f .tzctl.* d f
 - a mount point|cp -r root/usr/share/icu root/x; mkdir $s/tz/2016b/x|
     mounted root/x $s/tz/2016b/x rw cleanup; ls root/x|0|icutzformat.txt|d d f .tzctl.* d f
@@ -204,7 +204,7 @@ status, in order||in_order|0|fits
     Local time, UTC, does not change: it is not
 - what a start writes|link nowhere zoneinfo|told .next_start.warnings[0]|0|Bad zoneinfo link nowhere
 - a verdict|link @e tz_latest|told '[.next_start["current", "latest"]]'|0|["fits","other schema"]
-- a reason that only now holds|rm -r $s/tz/2016g/icutz; ln -s ../../icutz $s/tz/2016g/icutz; link @g tz_latest|
+- a reason that the start itself changes|rm -r $s/tz/2016g/icutz; ln -s ../../icutz $s/tz/2016g/icutz; link @g tz_latest|
     ctl|0|2016g is compatible and newer than 2016d.
 - no updates|rm -r $s/tz/*; echo 9999999999a >root/usr/share/zoneinfo.default/+VERSION|ctl|0|  icutz     -> /var
 - what a start cannot replace|rm $s/localtime; touch $s/localtime|
@@ -232,8 +232,8 @@ status, in order||in_order|0|fits
     told .installed[0].release|0|null
 - a release without end|printf %09999d 0 >$s/tz/2016g/zoneinfo/+VERSION|
     told '.installed[0].release[5000:] == ""'|0|true
-- no current link that makes sense|link nowhere zoneinfo|told '[.findings[][:8]]'|0|"The loca","Bad zone"]
-- a current link by too long a name|link $(printf %0300d 0) zoneinfo|ctl check|2|TZDATA CRITICAL
+- a current link that names no dataset|link nowhere zoneinfo|told '[.findings[][:8]]'|0|"The loca","Bad zone"]
+- a current link with too long a target|link $(printf %0300d 0) zoneinfo|ctl check|2|TZDATA CRITICAL
 - a latest link to nowhere|link nowhere tz_latest|told .findings[]|0|The latest link leads nowhere.
 - an ICU link left behind|ctl use system; ln -s x $s/icutz|told .findings[]|0|The ICU link is left
 - the order of versions||told '.installed[0].version + .installed[4].version + .system.version'|0|2016g2016b2016c.1.0
@@ -246,17 +246,17 @@ status, in order||in_order|0|fits
 - no zone|link /var/db/timezone/zoneinfo/Europe localtime|told .findings[]|0|The local-time link leads to no compiled
 - a zone with a slash at the end|link /var/db/timezone/zoneinfo/Europe/Paris/ localtime|
     told .links.localtime.state|0|dangling
-- a zone that is going|rm $s/tz/2016f/zoneinfo/Europe/Paris|told .findings[]|0|lacks the local zone
+- a zone that the next start removes|rm $s/tz/2016f/zoneinfo/Europe/Paris|told .findings[]|0|lacks the local zone
 - what cannot be read||disturbed getdents64:error=EIO status|1|Input/output error
 - what cannot be opened||disturbed openat:error=EMFILE:when=40+ status|1|: Too many open files
-- of ICU data, for once||disturbed "newfstatat:error=EIO:when=2 -P/var/db/timezone/tz/2016e/icutz" status|1|
+- ICU data that cannot be read once||disturbed "newfstatat:error=EIO:when=2 -P/var/db/timezone/tz/2016e/icutz" status|1|
     root/var/db/timezone/tz/2016e/icutz: Input/output error
 - what is only needed for clocks||disturbed memfd_create:error=EMFILE status|1|Too many open files
 - no local-time link|rm $s/localtime|told .findings[]|0|the next start makes it lead to /var/db/timezone/zoneinfo/Am
 - what only root can read|chmod 700 $s/tz/2016d|told .findings[2]|0|Only root can read what /var/db/timezone/loc
 - no compiled zone|echo x >$s/tz/2016d/zoneinfo/Europe/Paris|told .findings[]|0|leads to no compiled zone file: local
-- local time that others read|mkdir root/etc; ln -s /usr/share/zoneinfo.default/UTC root/etc/localtime; rm $s/zoneinfo|
-    told .findings|0|leads to no compiled zone file."
+- a broken local-time link that /etc/localtime does not use|mkdir root/etc;
+    ln -s /usr/share/zoneinfo.default/UTC root/etc/localtime; rm $s/zoneinfo|told .findings|0|leads to no compiled zone file."
 - what programs read|mkdir root/etc; ln -s /var/db/timezone/localtime root/etc;
     ln -s /var/db/timezone/zoneinfo root/usr/share|told '[.local_zone, .readers[]["path", "follows"]]'|0|
     ["Europe/Paris","/usr/share/zoneinfo","/etc/localtime",true,true]
@@ -272,7 +272,7 @@ check||ctl check|0|TZDATA OK - update 2016d is current, the next start adopts up
 - old data|link @b/zoneinfo zoneinfo; link @b/icutz icutz|ctl check|1|TZDATA WARNING - The current update is older
 - a start that fails|rm $s/{icutz,localtime}; mkdir -p $s/localtime/x|ctl check|2|TZDATA CRITICAL - The next start fails
 - printed to nowhere||ctl check >&-|3|standard output
-- no zones in what comes next|rm -r $s/tz/2016f/zoneinfo|ctl check|1|will show UTC
+- no zones in the latest update|rm -r $s/tz/2016f/zoneinfo|ctl check|1|will show UTC
 - no zones|rm -r $s/tz/2016d/zoneinfo|ctl check|2|TZDATA CRITICAL - The current link leads to no zone file
 - what cannot be read||disturbed openat:error=EMFILE:when=40+ check|3|TZDATA UNKNOWN - 
 - an empty word for the image||ctl check --root=|3|TZDATA UNKNOWN - --root
