@@ -164,11 +164,14 @@ use||ctl use 2016f|0|Current now: update 2016f.|f f f b d e f g
 - unfinished, then cleanup|ln -s 2016f $s/.tzctl.use.0; link @f/zoneinfo zoneinfo|ctl cleanup|0|2016d|f f f f
 - unfinished, and a failure again|ln -s 2016f $s/.tzctl.use.0|
     disturbed ?rename,?renameat,renameat2:error=EIO:when=1 cleanup|1|output error|d d f b d e f g .tzctl.use.0
+- unfinished, then cleanup as a rehearsal|ln -s 2016f $s/.tzctl.use.0|ctl cleanup --dry-run|1|was interrupted
 - unfinished, but refused by now|ln -s 2016e $s/.tzctl.use.0|ctl cleanup|0|
     cannot complete "use 2016e": 2016e: the next start would not keep it: 2016e has ICU schema|d d f d f
 cleanup||ctl cleanup|0|Deleted update 2016g|d d f d f
 - nothing|ctl cleanup|ctl cleanup|0|no update
 - as a rehearsal||ctl cleanup --dry-run|0|Would delete update 2016b
+- as a rehearsal beside a link in the place of the updates|mv $s/tz root/; ln -s /tz $s/tz|ctl cleanup --dry-run|1|
+    not a directory
 - how much it frees|head -c 3000000 /dev/zero >$s/tz/2016b/x; ln $s/tz/2016b/{x,y}|ctl cleanup --dry-run|0|b: 3.0 MB
 - what is no update|mkdir $s/tz/{lost+found,.snapshot,2016z.partial,.make-dataset.x}|ctl cleanup|0|2016g|
     d d f .make-dataset.x .snapshot d f lost+found z.partial
@@ -180,7 +183,7 @@ cleanup||ctl cleanup|0|Deleted update 2016g|d d f d f
     ctl cleanup; cat root/2016b/zoneinfo/Europe/Paris|0|TZif|d d f b d f
 - an update that a linked one passes|rm -r $s/tz/2016d; ln -s 2016g $s/tz/2016d; link tz/2016d/../2016b tz_latest|
     ctl cleanup|0|2016e|d d tz/2016d/../2016b b d g
-- a local-time link with too long a target|link $(printf %0300d 0) localtime|ctl cleanup --dry-run|0|Would delete update 2016b
+- a local-time link with too long a target|link $(printf %0300d 0) localtime|ctl cleanup --dry-run|0|update 2016b
 - a current link to nowhere|link nowhere zoneinfo|ctl cleanup|1|root/var/db/timezone/zoneinfo: names no dataset
 - no latest link that can be read|rm $s/tz_latest; touch $s/tz_latest|ctl cleanup|1|root/var/db/timezone/tz_latest:
 - an interruption||disturbed ?rename,?renameat,renameat2:signal=TERM:when=1 cleanup|143||d d f d e f g
@@ -199,12 +202,16 @@ status, in order||in_order|0|fits
 - of what is not in use||ctl|0|yes        no    may be removed
 - printed to nowhere||ctl status >/dev/full|1|standard output
 - at the end, local time||ctl|0|Local time, Europe/Paris, 
+- by a path with two slashes|rm $s/localtime; mkdir root/etc; ln -s /var/db/timezone/zoneinfo root/usr/share;
+    ln -s /usr/share/zoneinfo//Europe/Paris root/etc/localtime|ctl|0|Local time, Europe/Paris, 
+- where a file is in the place of the zones|rm -r $s/tz/2016d/zoneinfo; touch $s/tz/2016d/zoneinfo|ctl|0|
+    Local time cannot be compared
 - and that it cannot be compared|link nowhere zoneinfo|ctl|0|Local time cannot be compared: root/var/db/timezone/zo
 - local time by a link of its own|mkdir root/etc; ln -s /usr/share/zoneinfo.default/UTC root/etc/localtime|ctl|0|
     Local time, UTC, does not change: it is not
 - what a start writes|link nowhere zoneinfo|told .next_start.warnings[0]|0|Bad zoneinfo link nowhere
 - a verdict|link @e tz_latest|told '[.next_start["current", "latest"]]'|0|["fits","other schema"]
-- a reason that the start itself changes|rm -r $s/tz/2016g/icutz; ln -s ../../icutz $s/tz/2016g/icutz; link @g tz_latest|
+- a reason that the start changes|rm -r $s/tz/2016g/icutz; ln -s ../../icutz $s/tz/2016g/icutz; link @g tz_latest|
     ctl|0|2016g is compatible and newer than 2016d.
 - no updates|rm -r $s/tz/*; echo 9999999999a >root/usr/share/zoneinfo.default/+VERSION|ctl|0|  icutz     -> /var
 - what a start cannot replace|rm $s/localtime; touch $s/localtime|
@@ -256,10 +263,15 @@ status, in order||in_order|0|fits
 - what only root can read|chmod 700 $s/tz/2016d|told .findings[2]|0|Only root can read what /var/db/timezone/loc
 - no compiled zone|echo x >$s/tz/2016d/zoneinfo/Europe/Paris|told .findings[]|0|leads to no compiled zone file: local
 - a broken local-time link that /etc/localtime does not use|mkdir root/etc;
-    ln -s /usr/share/zoneinfo.default/UTC root/etc/localtime; rm $s/zoneinfo|told .findings|0|leads to no compiled zone file."
+    ln -s /usr/share/zoneinfo.default/UTC root/etc/localtime; rm $s/zoneinfo|told .findings|0|
+    leads to no compiled zone file."
 - what programs read|mkdir root/etc; ln -s /var/db/timezone/localtime root/etc;
     ln -s /var/db/timezone/zoneinfo root/usr/share|told '[.local_zone, .readers[]["path", "follows"]]'|0|
     ["Europe/Paris","/usr/share/zoneinfo","/etc/localtime",true,true]
+- local time that leads nowhere|mkdir root/etc; ln -s nowhere root/etc/localtime|told .findings|0|"/etc/localtime leads
+- local time that the next start breaks|mkdir root/etc; printf TZif2 >$s/tz/2016d/zoneinfo/UTC;
+    ln -s /var/db/timezone/zoneinfo/UTC root/etc/localtime|told .findings|0|lacks the local zone
+- an update that only root will be able to read|chmod 700 $s/tz/2016f|told .findings|0|that the next start makes
 - a link in the place of the updates|mv $s/tz root/; ln -s /tz $s/tz|told .findings[0]|0|tz is a symbolic link
 - no state directory|rm -r $s|told .findings[0]|0|systemd-tmpfiles or the builder
 - older than the system's own data|link @b/zoneinfo zoneinfo|

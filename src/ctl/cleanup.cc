@@ -78,7 +78,10 @@ bool delete_unused(const fs::descriptor& updates, bool rehearsed) {
 
 bool clean_up(bool rehearsed) {
     if (rehearsed) {
-        return delete_unused(tree::open(layout::updates_directory), rehearsed);
+        if (const auto version = unfinished_use()) {
+            refuse("\"use " + *version + "\"", "was interrupted: a clean-up completes that first");
+        }
+        return delete_unused(open_updates(tree::open(layout::state_directory)), rehearsed);
     }
     const work work;
     finish_interrupted_use(work);

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: BSD-2-Clause
 #include "ctl/diff.h"
 
+#include <algorithm>
+#include <array>
 #include <chrono>
 #include <filesystem>
 #include <iostream>
@@ -14,6 +16,7 @@
 #include "ctl/survey.h"
 #include "ctl/tree.h"
 #include "ctl/updates.h"
+#include "ctl/way.h"
 #include "fs/layout.h"
 
 namespace tz {
@@ -95,15 +98,23 @@ zone_directory open_operand(operand& wanted, const candidates& linked) {
 comparison compare(const zone_directory& from, const zone_directory& to) {
     const std::time_t now = std::time(nullptr);
     comparison done{from.name, to.name, now, now + ten_years, local_zone(), {}, true, {}, {}};
+    done.local_time_follows = leads_through(local_time_path(), layout::zoneinfo_link);
     leave_root();
     done.found = compare_visibly(from, to, done.start, done.end);
     return done;
 }
 
-// The zone of the local-time link, if the start replaces that.
+// The zone of the local-time link, if the start replaces that, and with it local time.
 std::optional<std::string> next_local_zone(const prediction& start) {
-    const bool stays = start.localtime == updates::target_of(layout::localtime_link);
-    return stays ? std::nullopt : zone_in(start.localtime.value_or(""));
+    const auto now = updates::target_of(layout::localtime_link);
+    const std::string path = local_time_path();
+    const bool reads_it =
+        path == layout::localtime_link ||
+        (now ? leads_through(path, layout::localtime_link) : !follow(path).leads_somewhere);
+    const auto zone = zone_in(start.localtime.value_or(""));
+    const bool same =
+        zone == zone_in(now.value_or("")) && leads_through(path, layout::zoneinfo_link);
+    return start.localtime == now || !reads_it || same ? std::nullopt : zone;
 }
 
 comparison compare_with_next(const foresight& next) {
@@ -112,11 +123,9 @@ comparison compare_with_next(const foresight& next) {
         refuse("the next start", "fails");
     }
     const auto zone = next_local_zone(start);
-    const bool follows = local_time_follows();
     auto done = compare(open_linked(linked.current, layout::zoneinfo_link, linked),
                         open_zones_of(start.result.dataset, linked));
     done.next_local_zone = zone;
-    done.local_time_follows = follows;
     return done;
 }
 
@@ -145,8 +154,10 @@ comparison effect_of_next_start() {
     try {
         return compare_with_next(foresee({}));
     } catch (const std::system_error& error) {
-        if (error.code() != std::errc::no_such_file_or_directory &&
-            error.code() != std::errc::function_not_supported) { // before Linux 5.6
+        constexpr std::array of_the_data{ENOENT, ENOTDIR, ELOOP, ENAMETOOLONG, EACCES};
+        const int why = error.code().value();
+        const bool obstacle = std::count(of_the_data.begin(), of_the_data.end(), why) != 0;
+        if (!obstacle && why != ENOSYS) { // as of Linux before 5.6
             throw;
         }
         none.obstacle = error.what();

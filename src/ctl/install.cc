@@ -108,7 +108,7 @@ void publish(const std::string& version, const fs::descriptor& staged,
 
 void install(const fs::descriptor& source, const std::string& shown, const std::string& version,
              bool forced) {
-    if (version.empty() || version[0] == '.') {
+    if (version.empty() || version[0] == '.' || !(forced || split_version(version))) {
         refuse(shown, no_version);
     }
     const work work;

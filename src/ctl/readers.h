@@ -8,16 +8,15 @@ namespace tz {
 
 inline constexpr char etc_localtime[] = "/etc/localtime";
 
+/// Where local time is read: /etc/localtime or, where that does not exist, the local-time link.
+[[nodiscard]] const char* local_time_path();
+
 /// The machine's zone, such as "Europe/Paris": that of the first link which names one on the way
-/// from /etc/localtime, or else from the local-time link. Nothing if no link names a zone.
+/// from there. Nothing if no link names a zone.
 [[nodiscard]] std::optional<std::string> local_zone();
 
-/// Whether following `path` passes the current link.
-[[nodiscard]] bool leads_through_current_link(const std::string& path);
-
-/// Whether local time is read through the current link: from /etc/localtime or, where that does not
-/// exist, from the local-time link.
-[[nodiscard]] bool local_time_follows();
+/// Whether following `path` passes `link`.
+[[nodiscard]] bool leads_through(const std::string& path, const char* link);
 
 /// The zone that a link's target names: what follows ".../zoneinfo.../".
 ///

@@ -106,9 +106,22 @@ std::string list(const std::vector<std::string>& zones) {
     return text.empty() ? "none" : text;
 }
 
+bool contains(const std::vector<std::string>& sorted, const std::string& zone) {
+    return std::binary_search(sorted.begin(), sorted.end(), zone);
+}
+
+// The zones that only the data before has valid files of.
+std::size_t count_lost(const zone_differences& found) {
+    const auto is_new = [&](const std::string& zone) {
+        return !contains(found.unreadable_before, zone);
+    };
+    return found.removed.size() +
+           static_cast<std::size_t>(
+               std::count_if(found.unreadable_after.begin(), found.unreadable_after.end(), is_new));
+}
+
 // One sentence.
 std::string effect_on_local_time(const comparison& done) {
-    const auto& zones = done.found.compared;
     if (done.next_local_zone) {
         return "The next start sets the local-time link to the zone " + *done.next_local_zone + ".";
     }
@@ -119,8 +132,11 @@ std::string effect_on_local_time(const comparison& done) {
     if (!done.local_time_follows) {
         return subject + "does not change: it is not read through the current link.";
     }
-    if (!std::binary_search(zones.begin(), zones.end(), *done.local_zone)) {
-        return subject + "cannot be compared: a dataset lacks a valid file of it.";
+    if (!contains(done.found.compared, *done.local_zone)) {
+        const bool lost = contains(done.found.removed, *done.local_zone) ||
+                          contains(done.found.unreadable_after, *done.local_zone);
+        return subject + (lost ? "will be UTC: " + done.to : "cannot be compared: " + done.from) +
+               " lacks a valid file of it.";
     }
     for (const auto& change : done.found.changed) {
         if (change.zone == *done.local_zone) {
@@ -209,11 +225,15 @@ void print_effect(const comparison& done) {
         std::cout << wrapped("Local time cannot be compared: " + done.obstacle + ".");
         return;
     }
-    const auto others =
-        std::count_if(done.found.changed.begin(), done.found.changed.end(),
-                      [&](const zone_change& change) { return change.zone != done.local_zone; });
-    std::cout << wrapped(effect_on_local_time(done) + " Other zones that change: " +
-                         (others == 0 ? "none" : std::to_string(others)) + ".");
+    const bool covers_zone = done.local_time_follows && !done.next_local_zone;
+    const auto others = std::count_if(
+        done.found.changed.begin(), done.found.changed.end(),
+        [&](const zone_change& change) { return !covers_zone || change.zone != done.local_zone; });
+    const std::size_t lost = count_lost(done.found);
+    std::cout << wrapped(
+        effect_on_local_time(done) +
+        " Other zones that change: " + (others == 0 ? "none" : std::to_string(others)) + "." +
+        (lost == 0 ? "" : " Zones that become UTC: " + std::to_string(lost) + "."));
 }
 
 } // namespace tz

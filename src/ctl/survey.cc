@@ -120,7 +120,7 @@ link describe_link(const char* path) {
 }
 
 reader describe_reader(const char* path) {
-    return {describe_link(path), leads_through_current_link(path)};
+    return {describe_link(path), leads_through(path, layout::zoneinfo_link)};
 }
 
 // What is wrong with the data, the worst first.
@@ -168,6 +168,7 @@ void add_problems_of_links(const survey& found, std::vector<std::string>& all) {
         add(link.state == link_state::ok && !follow(link.path).is_open_to_others(),
             "Only root can read what " + link.path + " leads to.");
     }
+    const bool etc_localtime_exists = updates::exists(etc_localtime);
     const bool has_local_time = follow(found.etc_localtime.place.path).leads_to_zone();
     add(found.localtime.state != link_state::missing &&
             !follow(layout::localtime_link).leads_to_zone(),
@@ -181,7 +182,13 @@ void add_problems_of_links(const survey& found, std::vector<std::string>& all) {
             !tree::holds_zones(next.result.dataset + layout::update_zoneinfo),
         "The next start makes data current that contains no zone file: programs that follow the "
         "current link will show UTC for every zone.");
-    add(found.localtime.state == link_state::ok && !next.has_local_time,
+    add(etc_localtime_exists && !has_local_time && follow(layout::localtime_link).leads_to_zone(),
+        std::string(etc_localtime) + " leads to no compiled zone file: local time is UTC.");
+    const auto next_zoneinfo = follow(next.result.dataset + layout::update_zoneinfo);
+    add(!next.result.dataset.empty() && next_zoneinfo.leads_somewhere &&
+            !next_zoneinfo.is_open_to_others() && next.result.decided == decision::adopt,
+        "Only root can read the data that the next start makes current.");
+    add(follow(local_time_path()).leads_to_zone() && !found.has_local_time_next,
         "The next start makes data current that lacks the local zone.");
     if (const auto version = unfinished_use()) {
         add(true, "\"tzctl use " + *version +
@@ -254,6 +261,8 @@ survey look() {
     {
         imagination::session imagined(in_image(""));
         found.next_start = predict_start(imagined);
+        found.has_local_time_next = imagined.leads_to_zone(local_time_path());
+        imagined.check();
     }
     found.zoneinfo_reader = describe_reader(layout::legacy_zoneinfo);
     found.etc_localtime = describe_reader(etc_localtime);

@@ -66,6 +66,7 @@ struct survey {
     bool marker = false; // whether the clean-up marker exists
     std::optional<std::string> record;
     prediction next_start;
+    bool has_local_time_next = false;  // whether local time is then read from a compiled zone file
     std::vector<std::string> findings; // problems, then warning lines of the look itself
 };
 

@@ -30,7 +30,7 @@ bool way::passes(const std::pair<dev_t, ino_t>& identity) const {
 
 bool way::leads_to_zone() const {
     return leads_somewhere && S_ISREG(passed.back().mode) &&
-           tree::is_zone(directory.number(), name, name);
+           tree::is_zone(directory.number(), name, shown);
 }
 
 way follow(const std::string& path) {
@@ -38,6 +38,7 @@ way follow(const std::string& path) {
     const std::string shown = in_image(path);
     const auto open_root = [] { return fs::descriptor(::open("/", O_PATH | O_CLOEXEC)); };
     way gone;
+    gone.shown = shown;
     std::string rest = path;
     int links = 0;
     for (fs::descriptor at = open_root(); !rest.empty();) {

@@ -25,6 +25,7 @@ struct way {
     bool leads_somewhere = false;
     fs::descriptor directory{-1}; // that contains the last entry
     std::string name;             // of the last entry there
+    std::string shown;            // the path that was followed, in messages
 
     /// Whether every user can follow it to its end, and read what is there.
     [[nodiscard]] bool is_open_to_others() const;

@@ -34,18 +34,6 @@ std::string name_of(const std::string& path) {
     return path.substr(path.find_last_of('/') + 1);
 }
 
-fs::descriptor open_updates(const fs::descriptor& state) {
-    std::string path = layout::updates_directory;
-    path.pop_back(); // or a link would be followed
-    fs::descriptor updates(
-        ::openat(state.number(), name_of(path).c_str(), directory_flags | O_NOFOLLOW));
-    if (!updates.is_open() && (errno == ENOTDIR || errno == ELOOP)) {
-        refuse(in_image(path), "not a directory (a symbolic link is not followed)");
-    }
-    check(updates.number(), in_image(path));
-    return updates;
-}
-
 // Nobody but root and the owner of the state directory can open the lock, and so hold it.
 fs::descriptor lock(const fs::descriptor& state) {
     const std::string shown = in_image(std::string(layout::state_directory) + lock_name);
@@ -142,6 +130,18 @@ bool is_as(const wanted_link& wanted) {
 }
 
 } // namespace
+
+fs::descriptor open_updates(const fs::descriptor& state) {
+    std::string path = layout::updates_directory;
+    path.pop_back(); // or a link would be followed
+    fs::descriptor updates(
+        ::openat(state.number(), name_of(path).c_str(), directory_flags | O_NOFOLLOW));
+    if (!updates.is_open() && (errno == ENOTDIR || errno == ELOOP)) {
+        refuse(in_image(path), "not a directory (a symbolic link is not followed)");
+    }
+    check(updates.number(), in_image(path));
+    return updates;
+}
 
 void imagine(const wanted_link& wanted) {
     const char* const path = wanted.path.c_str();

@@ -21,13 +21,16 @@ void imagine(const wanted_link& wanted);
 /// The version that a killed tzctl was about to make current.
 [[nodiscard]] std::optional<std::string> unfinished_use();
 
+/// Opens the directory of updates in the state directory. Throws also if it is a symbolic link,
+/// which could lead root to somewhere else.
+[[nodiscard]] fs::descriptor open_updates(const fs::descriptor& state);
+
 /// While this exists, no other tzctl changes anything, and an interruption ends this one only in
 /// interruption::check(). Everything half-made has a temporary name. The constructor and the
 /// destructor remove it, also what a killed tzctl left. What they cannot remove does no harm.
 class work {
   public:
-    /// Throws std::exception if another tzctl is running, or if the directory of updates is a
-    /// symbolic link, which could lead root to somewhere else.
+    /// Throws std::exception if another tzctl is running, or as open_updates.
     work();
     work(const work&) = delete;
     work& operator=(const work&) = delete;

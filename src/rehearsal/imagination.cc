@@ -264,6 +264,16 @@ std::optional<std::string> imagination::session::target_of(const char* link) con
                : std::optional<std::string>({target.data(), static_cast<std::size_t>(length)});
 }
 
+bool imagination::session::leads_to_zone(const char* path) const {
+    const fs::descriptor file(platform::open(path, O_RDONLY | O_CLOEXEC, 0));
+    struct stat status {};
+    std::array<char, 4> magic{};
+    return file.is_open() && platform::fstat(file.number(), &status) == 0 &&
+           S_ISREG(status.st_mode) &&
+           platform::read(file.number(), magic.data(), magic.size()) == ssize_t{magic.size()} &&
+           std::string_view(magic.data(), magic.size()) == "TZif";
+}
+
 std::vector<std::string> imagination::session::take_warnings() {
     return std::exchange(warnings, {});
 }

@@ -29,6 +29,9 @@ class session {
     /// The whole target of a link; nothing if there is none.
     [[nodiscard]] std::optional<std::string> target_of(const char* link) const;
 
+    /// Whether the path leads to a compiled zone file.
+    [[nodiscard]] bool leads_to_zone(const char* path) const;
+
     /// The warning lines since the last call, without the program's name, each cut off after 4,096
     /// bytes, and with an error only where the last call failed.
     [[nodiscard]] std::vector<std::string> take_warnings();

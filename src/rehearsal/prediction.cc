@@ -31,7 +31,6 @@ prediction predict_start(imagination::session& imagined) {
     start.icutz = after[1];
     start.localtime = after[2];
     start.changes = before != after;
-    start.has_local_time = fs::exists(layout::localtime_link);
     start.warnings = imagined.take_warnings();
     if (start.result.decided == decision::fail) {
         start.warnings.emplace_back(gave_up);

@@ -15,8 +15,7 @@ struct prediction {
     outcome result;
     std::optional<std::string> icutz; // targets of the links afterwards, if there are such
     std::optional<std::string> localtime;
-    bool changes = false;        // whether one of these, or the current link, then differs from now
-    bool has_local_time = false; // whether the local-time link then leads to something
+    bool changes = false; // whether one of these, or the current link, then differs from now
     std::vector<std::string> warnings;
 };
 
