@@ -124,7 +124,7 @@ install||ctl install 2016h|0|adopts update 2016h|d d h b d e f g h
     root/var/db/timezone/tz: not a directory (a symbolic link
 - no updates|rm -r $s/tz|ctl install 2016h|1|root/var/db/timezone/tz: No such file
 - no state directory|rm -r $s|ctl install 2016h|1|tzctl: root/var/db/timezone/: No such file
-- an interruption||disturbed sendfile:signal=INT:when=1 install 2016h|130|nterrupted
+- an interruption||disturbed sendfile:signal=TERM:when=1 install 2016h|143|nterrupted
 - a link that cannot be looked at|ln -s Europe 2016h/zoneinfo/x|disturbed openat2:error=EIO:when=1 install 2016h|1|
     2016h/zoneinfo/x: Input/output error
 - whose effect cannot be determined||disturbed memfd_create:error=EMFILE install 2016h|0|Too many open|d d h b d e f g h
