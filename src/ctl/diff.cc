@@ -150,9 +150,10 @@ comparison compare(std::vector<operand> operands) {
 }
 
 comparison effect_of_next_start() {
+    const auto next = foresee({});
     comparison none;
     try {
-        return compare_with_next(foresee({}));
+        return compare_with_next(next);
     } catch (const std::system_error& error) {
         constexpr std::array of_the_data{ENOENT, ENOTDIR, ELOOP, ENAMETOOLONG, EACCES};
         const int why = error.code().value();
