@@ -130,6 +130,8 @@ install||ctl install 2016h|0|adopts update 2016h|d d h b d e f g h
 - whose effect cannot be determined||disturbed memfd_create:error=EMFILE install 2016h|0|Too many open|d d h b d e f g h
 - a link that cannot be replaced||disturbed ?rename,?renameat,renameat2:error=EIO:when=2 install 2016h|1|
     root/var/db/timezone/tz_latest: Input/output error
+- what nobody else can read until it is installed||{ sleep 0.4; stat -c 'mode %a' $s/tz/.tzctl.*; } &
+    disturbed sendfile:delay_enter=800000:when=1 install 2016h; stat -c %a $s/tz/2016h|0|mode 700|d d h b d e f g h
 - a name that appears meanwhile||{ sleep 0.4; mkdir $s/tz/2016h; } &
     disturbed ?rename,?renameat,renameat2:delay_enter=800000:when=1 install 2016h|1|tz/2016h: |d d f b d e f g h
 - where renaming has no flags||disturbed renameat2:error=EINVAL install 2016h|0|adopts|d d h b d e f g h
@@ -201,14 +203,17 @@ status, in order||in_order|0|fits
 - of the latest update||ctl|0|yes        yes   latest
 - of what is not in use||ctl|0|yes        no    may be removed
 - printed to nowhere||ctl status >/dev/full|1|standard output
-- at the end, local time||ctl|0|Local time, Europe/Paris, 
+- at the end, local time by a link that the next start sets|rm $s/localtime|ctl|0|
+    The next start sets the local-time link to the zone America/Los_Angeles. Other
+- by another link than that|rm $s/localtime; mkdir root/etc;
+    ln -s /usr/share/zoneinfo.default/UTC root/etc/localtime|ctl|0|Local time, UTC, does not change: it is not
+- by a file|mkdir root/etc; cp root/usr/share/zoneinfo.default/UTC root/etc/localtime|ctl|0|
+    Local time: no link names the local zone.
 - by a path with two slashes|rm $s/localtime; mkdir root/etc; ln -s /var/db/timezone/zoneinfo root/usr/share;
     ln -s /usr/share/zoneinfo//Europe/Paris root/etc/localtime|ctl|0|Local time, Europe/Paris, 
 - where a file is in the place of the zones|rm -r $s/tz/2016d/zoneinfo; touch $s/tz/2016d/zoneinfo|ctl|0|
     Local time cannot be compared
 - and that it cannot be compared|link nowhere zoneinfo|ctl|0|Local time cannot be compared: root/var/db/timezone/zo
-- local time by a link of its own|mkdir root/etc; ln -s /usr/share/zoneinfo.default/UTC root/etc/localtime|ctl|0|
-    Local time, UTC, does not change: it is not
 - what a start writes|link nowhere zoneinfo|told .next_start.warnings[0]|0|Bad zoneinfo link nowhere
 - a verdict|link @e tz_latest|told '[.next_start["current", "latest"]]'|0|["fits","other schema"]
 - a reason that the start changes|rm -r $s/tz/2016g/icutz; ln -s ../../icutz $s/tz/2016g/icutz; link @g tz_latest|
@@ -271,6 +276,8 @@ status, in order||in_order|0|fits
 - local time that leads nowhere|mkdir root/etc; ln -s nowhere root/etc/localtime|told .findings|0|"/etc/localtime leads
 - local time that the next start breaks|mkdir root/etc; printf TZif2 >$s/tz/2016d/zoneinfo/UTC;
     ln -s /var/db/timezone/zoneinfo/UTC root/etc/localtime|told .findings|0|lacks the local zone
+- an update without zones that is kept|rm -r $s/tz/2016d/zoneinfo; link @d tz_latest|told '[.findings[][:22]]'|0|
+    ["The current link leads","The local-time link le"]
 - an update that only root will be able to read|chmod 700 $s/tz/2016f|told .findings|0|that the next start makes
 - a link in the place of the updates|mv $s/tz root/; ln -s /tz $s/tz|told .findings[0]|0|tz is a symbolic link
 - no state directory|rm -r $s|told .findings[0]|0|systemd-tmpfiles or the builder

@@ -189,6 +189,12 @@ def main(program):
             assert f"{other['from']} {other['to']}" == names, names
 
         lost = len({*found["removed"], *found["unreadable_to"]} - {*found["unreadable_from"]})
+        local_time = image / "etc/localtime"
+        local_time.rename(image / "etc/former")
+        local_time.symlink_to(f"../var/db/timezone/zoneinfo/{found['removed'][0]}")
+        assert f"{found['removed'][0]}, will be UTC: 2016d lacks" in " ".join(tzctl().split())
+        (image / "etc/former").rename(local_time)
+
         effect = f"Other zones that change: {len(changed) - 1}. Zones that become UTC: {lost}."
         for words, status, text in (
                 (["status"], 0, "Local time, Europe/Paris, changes at "), (["status"], 0, effect),

@@ -168,27 +168,28 @@ void add_problems_of_links(const survey& found, std::vector<std::string>& all) {
         add(link.state == link_state::ok && !follow(link.path).is_open_to_others(),
             "Only root can read what " + link.path + " leads to.");
     }
-    const bool etc_localtime_exists = updates::exists(etc_localtime);
-    const bool has_local_time = follow(found.etc_localtime.place.path).leads_to_zone();
-    add(found.localtime.state != link_state::missing &&
-            !follow(layout::localtime_link).leads_to_zone(),
+    const bool has_etc = found.etc_localtime.place.state != link_state::missing;
+    const bool etc_is_zone = follow(etc_localtime).leads_to_zone();
+    const bool link_is_zone = follow(layout::localtime_link).leads_to_zone();
+    add(found.localtime.state != link_state::missing && !link_is_zone,
         std::string("The local-time link leads to no compiled zone file") +
-            (has_local_time ? "." : ": local time is UTC."));
+            (etc_is_zone ? "." : ": local time is UTC."));
+    add(has_etc && !etc_is_zone && link_is_zone,
+        std::string(etc_localtime) + " leads to no compiled zone file: local time is UTC.");
     add(next.localtime && next.localtime != found.localtime.target,
         "The local-time link is " +
             std::string(found.localtime.state == link_state::missing ? "missing" : "invalid") +
             ": the next start makes it lead to " + next.localtime.value_or("") + ".");
-    add(!next.result.dataset.empty() &&
-            !tree::holds_zones(next.result.dataset + layout::update_zoneinfo),
-        "The next start makes data current that contains no zone file: programs that follow the "
-        "current link will show UTC for every zone.");
-    add(etc_localtime_exists && !has_local_time && follow(layout::localtime_link).leads_to_zone(),
-        std::string(etc_localtime) + " leads to no compiled zone file: local time is UTC.");
-    const auto next_zoneinfo = follow(next.result.dataset + layout::update_zoneinfo);
-    add(!next.result.dataset.empty() && next_zoneinfo.leads_somewhere &&
-            !next_zoneinfo.is_open_to_others() && next.result.decided == decision::adopt,
-        "Only root can read the data that the next start makes current.");
-    add(follow(local_time_path()).leads_to_zone() && !found.has_local_time_next,
+    if (next.result.decided == decision::adopt) {
+        const std::string zoneinfo = next.result.dataset + layout::update_zoneinfo;
+        const way there = follow(zoneinfo);
+        add(!tree::holds_zones(zoneinfo),
+            "The next start makes data current that contains no zone file: programs that follow "
+            "the current link will show UTC for every zone.");
+        add(there.leads_somewhere && !there.is_open_to_others(),
+            "Only root can read the data that the next start makes current.");
+    }
+    add((has_etc ? etc_is_zone : link_is_zone) && !found.has_local_time_next,
         "The next start makes data current that lacks the local zone.");
     if (const auto version = unfinished_use()) {
         add(true, "\"tzctl use " + *version +

@@ -154,10 +154,10 @@ std::optional<std::string> unfinished_use() {
     std::optional<std::string> version;
     if (const auto state = tree::open_if_any(layout::state_directory)) {
         tree::for_each_name(*state, in_image(layout::state_directory), [&](const auto& name) {
-            const bool is_note = name.starts_with(unfinished);
-            auto noted =
-                is_note ? updates::target_of(layout::state_directory + name) : std::nullopt;
-            version = noted ? std::move(noted) : version;
+            if (name.starts_with(unfinished)) {
+                const auto target = updates::target_of(layout::state_directory + name);
+                version = target ? target : version;
+            }
         });
     }
     return version;

@@ -36,7 +36,6 @@ class work {
     work& operator=(const work&) = delete;
     ~work();
 
-    [[nodiscard]] const fs::descriptor& state() const { return state_; }
     [[nodiscard]] const fs::descriptor& updates() const { return updates_; }
 
     /// Replaces the links in their order, each in one step: a reader always finds what was there or

@@ -13,6 +13,7 @@
 #include <map>
 #include <new>
 #include <optional>
+#include <string_view>
 #include <system_error>
 #include <utility>
 

@@ -4,7 +4,6 @@
 #include <array>
 
 #include "fs/layout.h"
-#include "fs/operations.h"
 
 namespace tz {
 namespace {
